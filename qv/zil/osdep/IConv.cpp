@@ -1,0 +1,189 @@
+#include "qv/zil/osdep/IConv.h"
+
+#include <iconv.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "qv/zil/Exceptions.h"
+#include "qv/zil/SafeInteger.h"
+
+namespace qv {
+namespace zil {
+namespace osdep {
+
+using exception::InvalidArgument;
+using exception::InvalidLocale;
+
+namespace {
+
+// iconv's name for the C library's wide character set.
+constexpr const char* kWideCharset = "WCHAR_T";
+
+// Owns one conversion descriptor and closes it on every way out.
+class Descriptor {
+public:
+    Descriptor(const char* to, const char* from) : m_descriptor(iconv_open(to, from)) {
+        if (m_descriptor == reinterpret_cast<iconv_t>(-1)) {
+            QV_THROW(InvalidLocale());
+        }
+    }
+    ~Descriptor() { iconv_close(m_descriptor); }
+    Descriptor(const Descriptor&) = delete;
+    Descriptor& operator=(const Descriptor&) = delete;
+
+    iconv_t Get() const { return m_descriptor; }
+
+private:
+    iconv_t m_descriptor;
+};
+
+// A null character-set name counts as the empty one, the current locale's set.
+const char* OrLocale(const char* charset) { return charset == nullptr ? "" : charset; }
+
+// Number of elements in [begin, end); a null begin with a null end is empty, any other
+// null or inverted range is refused.
+template <typename T>
+uint32_t Length(const T* begin, const T* end) {
+    if (begin == nullptr ? end != nullptr : end < begin) {
+        QV_THROW(InvalidArgument());
+    }
+    return begin == nullptr ? 0 : SafeInteger::FromSigned(end - begin);
+}
+
+// The character sets of one direction, its input unit in bytes, and the output unit that
+// stands in for input that cannot be converted.
+struct Direction {
+    const char* to;
+    const char* from;
+    size_t inputUnit;
+    const void* replacement;
+    size_t replacementSize;
+};
+
+// Converts inputBytes bytes at input into at most outputBytes bytes at output and returns
+// the number of bytes written. Whenever iconv stops early while input and room are left,
+// one replacement unit is written, one input unit skipped, and the conversion goes on.
+size_t Convert(const Direction& direction, const void* input, size_t inputBytes, void* output,
+               size_t outputBytes) {
+    const Descriptor descriptor(direction.to, direction.from);
+    char* in = static_cast<char*>(const_cast<void*>(input));
+    size_t inLeft = inputBytes;
+    char* out = static_cast<char*>(output);
+    size_t outLeft = outputBytes;
+    while (inLeft > 0 && outLeft > 0) {
+        if (iconv(descriptor.Get(), &in, &inLeft, &out, &outLeft) != static_cast<size_t>(-1)) {
+            continue;
+        }
+        if (inLeft == 0 || outLeft < direction.replacementSize) {
+            break;
+        }
+        std::memcpy(out, direction.replacement, direction.replacementSize);
+        out += direction.replacementSize;
+        outLeft -= direction.replacementSize;
+        const size_t skip = inLeft < direction.inputUnit ? inLeft : direction.inputUnit;
+        in += skip;
+        inLeft -= skip;
+    }
+    // Return a stateful character set to its initial shift state, so that the text
+    // ends well-formed (this writes nothing for stateless sets or when no room is left).
+    iconv(descriptor.Get(), nullptr, nullptr, &out, &outLeft);
+    return outputBytes - outLeft;
+}
+
+const wchar_t kWideReplacement = L'?';
+const char kNarrowReplacement = '?';
+
+// Converts narrow input to wide output; returns the number of elements written.
+uint32_t ToWide(const char* input, const char* inputEnd, const char* charset, wchar_t* output,
+                wchar_t* outputEnd) {
+    const uint32_t inputBytes = Length(input, inputEnd);
+    const uint32_t room = Length(output, outputEnd);
+    if (inputBytes == 0 || room == 0) {
+        Descriptor check(kWideCharset, OrLocale(charset));  // an unknown set is still refused
+        return 0;
+    }
+    const Direction direction{kWideCharset, OrLocale(charset), 1, &kWideReplacement,
+                              sizeof(wchar_t)};
+    const size_t bytes =
+        Convert(direction, input, inputBytes, output, static_cast<size_t>(room) * sizeof(wchar_t));
+    return static_cast<uint32_t>(bytes / sizeof(wchar_t));
+}
+
+// Converts wide input to narrow output; returns the number of bytes written.
+uint32_t ToNarrow(const wchar_t* input, const wchar_t* inputEnd, char* output, char* outputEnd,
+                  const char* charset) {
+    const uint32_t inputElements = Length(input, inputEnd);
+    const uint32_t room = Length(output, outputEnd);
+    if (inputElements == 0 || room == 0) {
+        Descriptor check(OrLocale(charset), kWideCharset);
+        return 0;
+    }
+    const Direction direction{OrLocale(charset), kWideCharset, sizeof(wchar_t), &kNarrowReplacement,
+                              1};
+    return static_cast<uint32_t>(Convert(
+        direction, input, static_cast<size_t>(inputElements) * sizeof(wchar_t), output, room));
+}
+
+}  // namespace
+
+void IConv::NarrowToWide(const char* input, const char* inputEnd, const char* charset,
+                         wchar_t* output, wchar_t*& outputEnd) {
+    outputEnd = output + ToWide(input, inputEnd, charset, output, outputEnd);
+}
+
+uint32_t IConv::NarrowToWideCount(const char* input, const char* inputEnd, const char* charset,
+                                  wchar_t* output, wchar_t* outputEnd) {
+    return ToWide(input, inputEnd, charset, output, outputEnd);
+}
+
+std::unique_ptr<wchar_t[]> IConv::NarrowToWideNewArray(const char* input, const char* inputEnd,
+                                                       const char* charset) {
+    const uint32_t inputBytes = Length(input, inputEnd);
+    // At most one element per input byte, plus the terminator.
+    const uint32_t elements = SafeInteger::Add(inputBytes, 1);
+    SafeInteger::Multiply(elements, sizeof(wchar_t));
+    std::unique_ptr<wchar_t[]> result(new wchar_t[elements]);
+    uint32_t written = 0;
+    if (inputBytes != 0) {
+        written = ToWide(input, inputEnd, charset, result.get(), result.get() + inputBytes);
+    }
+    result[written] = 0;
+    return result;
+}
+
+std::unique_ptr<wchar_t[]> IConv::NarrowTextToWideNewArray(const char* text, uint32_t maxLength,
+                                                           const char* charset) {
+    if (text == nullptr) {
+        return NarrowToWideNewArray(nullptr, nullptr, charset);
+    }
+    return NarrowToWideNewArray(text, text + strnlen(text, maxLength), charset);
+}
+
+void IConv::WideToNarrow(const wchar_t* input, const wchar_t* inputEnd, char* output,
+                         char*& outputEnd, const char* charset) {
+    outputEnd = output + ToNarrow(input, inputEnd, output, outputEnd, charset);
+}
+
+uint32_t IConv::WideToNarrowCount(const wchar_t* input, const wchar_t* inputEnd, char* output,
+                                  char* outputEnd, const char* charset) {
+    return ToNarrow(input, inputEnd, output, outputEnd, charset);
+}
+
+std::unique_ptr<char[]> IConv::WideToNarrowNewArray(const wchar_t* input, const wchar_t* inputEnd,
+                                                    const char* charset) {
+    const uint32_t inputElements = Length(input, inputEnd);
+    // Four bytes per input element, plus the terminator.
+    const uint32_t bytes = SafeInteger::Add(SafeInteger::Multiply(inputElements, 4), 1);
+    std::unique_ptr<char[]> result(new char[bytes]);
+    uint32_t written = 0;
+    if (inputElements != 0) {
+        written = ToNarrow(input, inputEnd, result.get(), result.get() + bytes - 1, charset);
+    }
+    result[written] = '\0';
+    return result;
+}
+
+}  // namespace osdep
+}  // namespace zil
+}  // namespace qv
