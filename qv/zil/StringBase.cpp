@@ -60,26 +60,31 @@ uint32_t Smaller(uint32_t a, uint32_t b) { return a < b ? a : b; }
 }  // namespace
 
 template <typename E>
-StringBase<E>::StringBase() : m_pBegin(nullptr), m_pEnd(nullptr), m_pCapacityEnd(nullptr) {
-    m_pBegin = static_cast<E*>(std::malloc(sizeof(E)));
+StringBase<E>::StringBase(size_type capacity, Reserved)
+    : m_pBegin(static_cast<E*>(std::malloc(BlockBytes<E>(capacity)))),
+      m_pEnd(m_pBegin),
+      m_pCapacityEnd(m_pBegin) {
     if (m_pBegin == nullptr) {
         throw std::bad_alloc();
     }
+    m_pCapacityEnd += capacity;
     *m_pBegin = E();
-    m_pEnd = m_pCapacityEnd = m_pBegin;
 }
 
-// The delegated-to constructor has finished before each body below runs, so the
-// destructor frees the block when a body throws.
+// Once a delegated-to constructor has finished, the object owns its block: the
+// destructor frees it when a constructor body below throws.
+template <typename E>
+StringBase<E>::StringBase() : StringBase(0, Reserved::kTag) {}
+
 template <typename E>
 StringBase<E>::StringBase(const E* text) : StringBase(text, TextLength(text)) {}
 
 template <typename E>
-StringBase<E>::StringBase(const E* data, size_type length) : StringBase() {
+StringBase<E>::StringBase(const E* data, size_type length)
+    : StringBase(data == nullptr ? 0 : length, Reserved::kTag) {
     if (data == nullptr || length == 0) {
         return;
     }
-    Reallocate(length);
     std::memcpy(m_pBegin, data, length * sizeof(E));
     m_pEnd = m_pBegin + length;
     *m_pEnd = E();
@@ -376,8 +381,7 @@ typename StringBase<E>::size_type StringBase<E>::find_last_not_of(const E* set,
 
 template <typename E>
 StringBase<E> operator+(const StringBase<E>& a, const StringBase<E>& b) {
-    StringBase<E> result;
-    result.reserve(SafeInteger::Add(a.size(), b.size()));
+    StringBase<E> result(SafeInteger::Add(a.size(), b.size()), StringBase<E>::Reserved::kTag);
     result.append(a);
     result.append(b);
     return result;
@@ -385,54 +389,54 @@ StringBase<E> operator+(const StringBase<E>& a, const StringBase<E>& b) {
 
 // Conversions ---------------------------------------------------------------------------
 
+namespace {
+// Bytes of the UTF-8 form of a wide string; invalid values count one byte for their "?".
+uint32_t Utf8Length(const WideString& wide) {
+    return WideToUtf8::Measure(wide.data(), wide.data() + wide.size());
+}
+
+// Code points of a UTF-8 string; malformed input throws InvalidSequence.
+uint32_t CodePointCount(const ByteString& utf8) {
+    return Utf8ToWide::Count(utf8.data(), utf8.data() + utf8.size());
+}
+}  // namespace
+
 template <>
-StringBase<char>::StringBase(const WideString& other) : StringBase() {
+StringBase<char>::StringBase(const WideString& other)
+    : StringBase(Utf8Length(other), Reserved::kTag) {
     const wchar_t* input = other.data();
-    const wchar_t* const inputEnd = input + other.size();
-    const size_type length = WideToUtf8::Measure(input, inputEnd);
-    if (length == 0) {
-        return;
-    }
-    Reallocate(length);
-    m_pEnd = m_pBegin + WideToUtf8::ConvertAll(input, inputEnd, m_pBegin, m_pBegin + length);
+    m_pEnd += WideToUtf8::ConvertAll(input, input + other.size(), m_pBegin, m_pCapacityEnd);
     *m_pEnd = '\0';
 }
 
 template <>
-StringBase<wchar_t>::StringBase(const ByteString& other) : StringBase() {
+StringBase<wchar_t>::StringBase(const ByteString& other)
+    : StringBase(CodePointCount(other), Reserved::kTag) {
     const char* input = other.data();
-    const char* const inputEnd = input + other.size();
-    const size_type count = Utf8ToWide::Count(input, inputEnd);
-    if (count == 0) {
-        return;
-    }
-    Reallocate(count);
-    m_pEnd = m_pBegin + Utf8ToWide::ConvertAll(input, inputEnd, m_pBegin, m_pBegin + count);
+    m_pEnd += Utf8ToWide::ConvertAll(input, input + other.size(), m_pBegin, m_pCapacityEnd);
     *m_pEnd = L'\0';
 }
 
+// Room for four bytes per wide element.
 template <>
 StringBase<char>::StringBase(const wchar_t* data, size_type length, const char* charset)
-    : StringBase() {
+    : StringBase(data == nullptr ? 0 : SafeInteger::Multiply(length, 4), Reserved::kTag) {
     if (data == nullptr || length == 0) {
         return;
     }
-    // Room for four bytes per wide element.
-    Reallocate(SafeInteger::Multiply(length, 4));
     char* reached = m_pCapacityEnd;
     osdep::IConv::WideToNarrow(data, data + length, m_pBegin, reached, charset);
     m_pEnd = reached;
     *m_pEnd = '\0';
 }
 
+// At most one wide element per input byte.
 template <>
 StringBase<wchar_t>::StringBase(const char* data, size_type length, const char* charset)
-    : StringBase() {
+    : StringBase(data == nullptr ? 0 : length, Reserved::kTag) {
     if (data == nullptr || length == 0) {
         return;
     }
-    // At most one wide element per input byte.
-    Reallocate(length);
     wchar_t* reached = m_pCapacityEnd;
     osdep::IConv::NarrowToWide(data, data + length, charset, m_pBegin, reached);
     m_pEnd = reached;

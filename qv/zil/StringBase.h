@@ -95,6 +95,13 @@ public:
     }
 
 private:
+    template <typename T>
+    friend StringBase<T> operator+(const StringBase<T>& a, const StringBase<T>& b);
+
+    // An empty string whose block holds exactly `capacity` elements and the terminator.
+    enum class Reserved { kTag };
+    StringBase(size_type capacity, Reserved);
+
     void ExactFit(size_type n);
     void Reallocate(size_type n);
     void GrowForAppend(size_type added);

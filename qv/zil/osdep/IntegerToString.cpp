@@ -17,15 +17,24 @@ WideString FormatUnsigned(U value, uint32_t radix) {
     }
     // One element per bit, plus the terminator that stays 0.
     constexpr uint32_t kBits = sizeof(U) * 8;
-    wchar_t digits[kBits + 1] = {};
+    wchar_t digits[kBits + 1];
     wchar_t* position = digits + kBits;
-    do {
-        if (position == digits) {
-            QV_THROW(exception::UnableToConvert());
-        }
-        *--position = Digit(static_cast<uint32_t>(value % radix), radix);
-        value = static_cast<U>(value / radix);
-    } while (value != 0);
+    *position = 0;
+    if (radix == 10) {
+        // The common case, with a constant divisor the compiler turns into a multiply.
+        do {
+            *--position = kDigits[value % 10];
+            value = static_cast<U>(value / 10);
+        } while (value != 0);
+    } else {
+        do {
+            if (position == digits) {
+                QV_THROW(exception::UnableToConvert());
+            }
+            *--position = Digit(static_cast<uint32_t>(value % radix), radix);
+            value = static_cast<U>(value / radix);
+        } while (value != 0);
+    }
     return WideString(position, static_cast<uint32_t>(digits + kBits - position));
 }
 
