@@ -1,0 +1,129 @@
+// The store as text, as both writers put it on disk. Serialising never touches a file, so a
+// value that cannot be split fails before anything is opened.
+#include "config/IniModel.h"
+
+#include <cstdio>
+
+using qv_ini::Key;
+using qv_ini::Section;
+
+namespace {
+
+const char kNullSection[] = "(null)";
+
+void AppendPiece(std::string* out, const Key& key, const char* separator, int counter,
+                 std::string_view piece) {
+    char number[16];
+    std::snprintf(number, sizeof number, "%04d", counter);
+    *out += key.name;
+    *out += " Line";
+    *out += number;
+    *out += separator;
+    if (key.quote) {
+        *out += static_cast<char>(key.quote);
+    }
+    *out += piece;
+    if (key.quote) {
+        *out += static_cast<char>(key.quote);
+    }
+    *out += '\n';
+}
+
+// The end of the next piece of value starting at begin, or begin when no piece fits.
+size_t PieceEnd(const IniStore& store, const Key& key, size_t begin, size_t allowance) {
+    const std::string& value = key.value;
+    if (value.size() - begin <= allowance) {
+        return value.size();
+    }
+    size_t end = begin + allowance;
+    if (store.breakCharacter) {
+        size_t at = std::string_view(value).substr(begin, allowance).rfind(store.breakCharacter);
+        if (at != std::string_view::npos) {
+            end = begin + at + 1;
+        }
+    }
+    if (!key.quote) {
+        // Reading trims every piece: an unquoted piece must not begin or end in white space.
+        while (end > begin && (qv_ini::IsSpace(value[end - 1]) || qv_ini::IsSpace(value[end]))) {
+            --end;
+        }
+    }
+    return end;
+}
+
+int AppendKey(std::string* out, const IniStore& store, const Key& key, const char* separator,
+              size_t separatorLength) {
+    const size_t quotes = key.quote ? 2 : 0;
+    const size_t length = key.name.size() + separatorLength + key.value.size() + quotes;
+    if (store.maxLineLength < 0 || length <= static_cast<size_t>(store.maxLineLength)) {
+        *out += key.name;
+        *out += separator;
+        if (key.quote) {
+            *out += static_cast<char>(key.quote);
+        }
+        *out += key.value;
+        if (key.quote) {
+            *out += static_cast<char>(key.quote);
+        }
+        *out += '\n';
+        return 0;
+    }
+    const int64_t allowance = static_cast<int64_t>(store.maxLineLength) - 12 -
+                              static_cast<int64_t>(key.name.size()) - static_cast<int64_t>(quotes);
+    if (allowance <= 0) {
+        return kIniCannotSplit;
+    }
+    int counter = 1;
+    for (size_t begin = 0; begin < key.value.size(); ++counter) {
+        size_t end = PieceEnd(store, key, begin, static_cast<size_t>(allowance));
+        if (end == begin) {
+            return kIniCannotSplit;
+        }
+        AppendPiece(out, key, separator, counter,
+                    std::string_view(key.value).substr(begin, end - begin));
+        begin = end;
+    }
+    return 0;
+}
+
+}  // namespace
+
+namespace qv_ini {
+
+int Serialize(const IniStore& store, std::string* out) {
+    const uint32_t flags = store.writeFlags;
+    const bool compact = (flags & kIniWriteCompact) != 0;
+    const char* separator = (flags & kIniWriteSpacedEquals) ? " = " : "=";
+    const size_t separatorLength = (flags & kIniWriteSpacedEquals) ? 3 : 1;
+    out->clear();
+    if (flags & kIniWriteBom) {
+        *out += "\xEF\xBB\xBF";
+    }
+    for (size_t i = 0; i < store.sections.size(); ++i) {
+        const Section& section = *store.sections[i];
+        const bool fromFile = section.line >= 0;
+        // Only a leading "(null)" section goes without a header: anywhere else its keys
+        // would be read back into the section before it.
+        const bool headless = i == 0 && section.name == kNullSection;
+        if (compact && !fromFile && i > 0 && store.sections[i - 1]->line >= 0) {
+            *out += '\n';
+        }
+        if (!headless) {
+            *out += '[';
+            *out += section.name;
+            *out += "]\n";
+        }
+        for (const auto& key : section.keys) {
+            int rc = AppendKey(out, store, *key, separator, separatorLength);
+            if (rc < 0) {
+                return rc;
+            }
+        }
+        if (!(compact && (fromFile || section.name == kNullSection))) {
+            *out += '\n';
+        }
+    }
+    return 0;
+}
+
+}  // namespace qv_ini
