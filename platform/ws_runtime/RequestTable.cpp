@@ -1,0 +1,123 @@
+#include "platform/ws_runtime/RequestTable.h"
+
+#include <cstring>
+#include <memory>
+#include <mutex>
+#include <unordered_map>
+
+namespace qv {
+namespace wsruntime {
+
+namespace {
+
+struct RequestState {
+    const RequestVariables* variables;
+    RequestTable::Response response;
+};
+
+// The process-wide table. The lock guards the map only: a request's state is used by the
+// one thread serving it, between Open and Close.
+struct Table {
+    std::mutex lock;
+    std::unordered_map<uint32_t, std::unique_ptr<RequestState>> requests;
+    uint32_t nextHandle = 1;
+};
+
+Table& TheTable() {
+    static Table table;
+    return table;
+}
+
+RequestState* Lookup(uint32_t handle) {
+    Table& table = TheTable();
+    std::lock_guard<std::mutex> guard(table.lock);
+    auto found = table.requests.find(handle);
+    return found == table.requests.end() ? nullptr : found->second.get();
+}
+
+}  // namespace
+
+uint32_t RequestTable::Open(const RequestVariables& variables) {
+    auto state = std::make_unique<RequestState>();
+    state->variables = &variables;
+    Table& table = TheTable();
+    std::lock_guard<std::mutex> guard(table.lock);
+    uint32_t handle = table.nextHandle;
+    while (handle == 0 || table.requests.count(handle) != 0) {
+        ++handle;
+    }
+    table.nextHandle = handle + 1;
+    table.requests.emplace(handle, std::move(state));
+    return handle;
+}
+
+RequestTable::Response RequestTable::Close(uint32_t handle) {
+    std::unique_ptr<RequestState> state;
+    {
+        Table& table = TheTable();
+        std::lock_guard<std::mutex> guard(table.lock);
+        auto found = table.requests.find(handle);
+        if (found == table.requests.end()) {
+            return Response();
+        }
+        state = std::move(found->second);
+        table.requests.erase(found);
+    }
+    return std::move(state->response);
+}
+
+uint32_t RequestTable::OpenCount() {
+    Table& table = TheTable();
+    std::lock_guard<std::mutex> guard(table.lock);
+    return static_cast<uint32_t>(table.requests.size());
+}
+
+}  // namespace wsruntime
+}  // namespace qv
+
+using qv::wsruntime::Lookup;
+using qv::wsruntime::RequestState;
+
+extern "C" int32_t ReadRequestVariable_C_REST_QV_GXWS_(uint32_t handle, const char* name,
+                                                       char* buffer, uint32_t* size) {
+    if (size == nullptr) {
+        return -1;
+    }
+    RequestState* state = Lookup(handle);
+    const std::string* value =
+        (state == nullptr || name == nullptr) ? nullptr : state->variables->Find(name);
+    if (value == nullptr || value->size() >= 0xFFFFFFFFu) {
+        *size = 0;
+        return -1;
+    }
+    const uint32_t needed = static_cast<uint32_t>(value->size()) + 1;
+    if (buffer != nullptr && *size > 0) {
+        const uint32_t copied = *size - 1 < needed - 1 ? *size - 1 : needed - 1;
+        std::memcpy(buffer, value->data(), copied);
+        buffer[copied] = '\0';
+    }
+    *size = needed;
+    return 0;
+}
+
+extern "C" int32_t SetHTTPResponseCode_QV_GXWS_(uint32_t handle, int32_t status) {
+    RequestState* state = Lookup(handle);
+    if (state == nullptr || status < 100 || status > 599) {
+        return -1;
+    }
+    state->response.status = status;
+    return 0;
+}
+
+extern "C" int32_t WriteOutput_C_REST_QV_GXWS_(uint32_t handle, const char* data, uint32_t length) {
+    RequestState* state = Lookup(handle);
+    if (state == nullptr || (data == nullptr && length != 0)) {
+        return -1;
+    }
+    try {
+        state->response.body.append(data, length);
+    } catch (...) {  // out of memory: a C caller cannot take an exception
+        return -1;
+    }
+    return 0;
+}

@@ -1,0 +1,85 @@
+#include <cstring>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "platform/ws_runtime/RequestTable.h"
+#include "platform/ws_runtime/RequestVariables.h"
+#include "platform/ws_runtime/WsRuntime.h"
+
+namespace qv {
+namespace wsruntime {
+namespace {
+
+TEST(RequestVariablesTest, SearchOrderAndHeaderMatching) {
+    RequestVariables variables;
+    variables.AddHeader("X-QV-Accept", "from-header");
+    variables.AddExact("form", "f");
+    variables.AddExact("x_qv_accept", "exact-lower");
+    variables.AddHeader("Session", "7");
+
+    // Exact names are case-sensitive; headers fold case and '-'/'_'.
+    EXPECT_EQ(*variables.Find("X_QV_ACCEPT"), "from-header");
+    EXPECT_EQ(*variables.Find("x_qv_accept"), "exact-lower");  // exact beats header
+    EXPECT_EQ(*variables.Find("session"), "7");
+    EXPECT_EQ(variables.Find("Form"), nullptr);
+    EXPECT_EQ(variables.Find("X_QV_ACCEPTX"), nullptr);
+    EXPECT_TRUE(RequestVariables::HeaderMatches("a-b_c", "A_B-C"));
+    EXPECT_FALSE(RequestVariables::HeaderMatches("a.b", "a_b"));
+}
+
+TEST(RequestTableTest, RuntimeFunctionsFillTheRequestsOwnResponse) {
+    RequestVariables variables;
+    variables.AddExact("name", "hello");
+    variables.AddExact("empty", "");
+    const uint32_t handle = RequestTable::Open(variables);
+    const uint32_t other = RequestTable::Open(variables);
+    EXPECT_NE(handle, 0u);
+    EXPECT_NE(handle, other);
+
+    uint32_t size = 0;
+    EXPECT_EQ(ReadRequestVariable_C_REST_QV_GXWS_(handle, "name", nullptr, &size), 0);
+    EXPECT_EQ(size, 6u);
+    char buffer[6] = {'x', 'x', 'x', 'x', 'x', 'x'};
+    EXPECT_EQ(ReadRequestVariable_C_REST_QV_GXWS_(handle, "name", buffer, &size), 0);
+    EXPECT_STREQ(buffer, "hello");
+
+    // A short buffer gets what fits and a NUL; the size says what is needed.
+    char shortBuffer[3];
+    size = 3;
+    ReadRequestVariable_C_REST_QV_GXWS_(handle, "name", shortBuffer, &size);
+    EXPECT_STREQ(shortBuffer, "he");
+    EXPECT_EQ(size, 6u);
+
+    size = 0;
+    ReadRequestVariable_C_REST_QV_GXWS_(handle, "empty", nullptr, &size);
+    EXPECT_EQ(size, 1u);
+    size = 9;
+    EXPECT_EQ(ReadRequestVariable_C_REST_QV_GXWS_(handle, "absent", nullptr, &size), -1);
+    EXPECT_EQ(size, 0u);
+
+    EXPECT_EQ(SetHTTPResponseCode_QV_GXWS_(handle, 406), 0);
+    EXPECT_EQ(SetHTTPResponseCode_QV_GXWS_(handle, 99), -1);
+    EXPECT_EQ(WriteOutput_C_REST_QV_GXWS_(handle, "ab\0c", 4), 0);
+    EXPECT_EQ(WriteOutput_C_REST_QV_GXWS_(other, "z", 1), 0);
+
+    RequestTable::Response response = RequestTable::Close(handle);
+    EXPECT_EQ(response.status, 406);
+    EXPECT_EQ(response.body, std::string("ab\0c", 4));
+    RequestTable::Response second = RequestTable::Close(other);
+    EXPECT_EQ(second.status, 0);
+    EXPECT_EQ(second.body, "z");
+
+    // Closed handles are unknown to every function.
+    size = 5;
+    EXPECT_EQ(ReadRequestVariable_C_REST_QV_GXWS_(handle, "name", nullptr, &size), -1);
+    EXPECT_EQ(size, 0u);
+    EXPECT_EQ(WriteOutput_C_REST_QV_GXWS_(handle, "a", 1), -1);
+    EXPECT_EQ(SetHTTPResponseCode_QV_GXWS_(handle, 500), -1);
+    EXPECT_EQ(RequestTable::Close(handle).body, "");
+    EXPECT_EQ(RequestTable::OpenCount(), 0u);
+}
+
+}  // namespace
+}  // namespace wsruntime
+}  // namespace qv
