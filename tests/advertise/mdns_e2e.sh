@@ -10,16 +10,13 @@
 #   cross build) is put before each of them.
 set -uo pipefail
 
+# shellcheck source=../lib/private_system.sh
+. "$(dirname "$0")/../lib/private_system.sh"
+
 if [ "${1:-}" != "--inside" ]; then
   [ $# -ge 1 ] || { echo "usage: $0 BIN_DIR [EMULATOR...]" >&2; exit 2; }
-  for tool in unshare ip dbus-daemon avahi-daemon avahi-browse avahi-publish timeout; do
-    command -v "$tool" >/dev/null || { echo "SKIP: $tool is not installed"; exit 77; }
-  done
-  if ! unshare --mount --net --pid --fork --mount-proc --propagation private true 2>/dev/null; then
-    echo "SKIP: private namespaces are not permitted here"
-    exit 77
-  fi
-  exec unshare --mount --net --pid --fork --mount-proc --propagation private "$0" --inside "$@"
+  require_tools unshare ip dbus-daemon avahi-daemon avahi-browse avahi-publish timeout
+  enter_private_namespaces "$0" "$@"
 fi
 shift
 
@@ -29,49 +26,9 @@ emulator=("$@")
 probe=("${emulator[@]}" "$bin_dir/advertise_probe")
 discover=("${emulator[@]}" "$bin_dir/qv-discover")
 
-fail=0
-pass() { echo "PASS: $*"; }
-failed() { echo "FAIL: $*"; fail=1; }
-
-# Polls a command until it succeeds or the deadline (seconds) passes.
-wait_for() {
-  local deadline=$(($(date +%s) + $1))
-  shift
-  until "$@"; do
-    [ "$(date +%s)" -lt "$deadline" ] || return 1
-    sleep 0.1
-  done
-}
-
 # ---------------------------------------------------------------- private system
 bin_dir=$(cd "$bin_dir" && pwd -P) || exit 1
-# A build tree under /tmp or /run would vanish under the private tmpfs: keep a handle on the
-# old directory and bind the tree's top folder back at the same path (its RUNPATHs need it).
-keep_tree() {
-  local top=$1 rel=${bin_dir#"$1"/}
-  [ "$rel" != "$bin_dir" ] || return 0
-  rel=${rel%%/*}
-  exec {old}<"$top"
-  mount -t tmpfs tmpfs "$top" || exit 1
-  mkdir -p "$top/$rel"
-  mount --no-canonicalize --bind "/proc/self/fd/$old/$rel" "$top/$rel" || exit 1
-  exec {old}<&-
-}
-for top in /tmp /run; do
-  case "$bin_dir" in
-    "$top"/*) keep_tree "$top" ;;
-    *) mount -t tmpfs tmpfs "$top" || exit 1 ;;
-  esac
-done
-work=/tmp/work
-mkdir -p "$work/etc"
-# A private /etc holding velmora/share, so that the fixed configuration path is usable.
-mount -t tmpfs tmpfs "$work/etc" && cp -a /etc/. "$work/etc/" && mount --bind "$work/etc" /etc ||
-  { echo "cannot make a private /etc" >&2; exit 1; }
-mkdir -p /etc/velmora/share
-rm -f /etc/velmora/share/qv-rt.ini
-
-ip link set lo up
+make_private_system "$bin_dir"
 # v1 carries the default route and is the only interface Avahi uses; v0 sorts first by
 # name, so a wrong choice of the default interface shows up as the wrong MAC.
 ip link add v0 type veth peer name v1

@@ -8,16 +8,13 @@
 # Usage: webhost_e2e.sh BIN_DIR LIB_DIR [EMULATOR...]
 set -uo pipefail
 
+# shellcheck source=../lib/private_system.sh
+. "$(dirname "$0")/../lib/private_system.sh"
+
 if [ "${1:-}" != "--inside" ]; then
   [ $# -ge 2 ] || { echo "usage: $0 BIN_DIR LIB_DIR [EMULATOR...]" >&2; exit 2; }
-  for tool in unshare ip curl timeout; do
-    command -v "$tool" >/dev/null || { echo "SKIP: $tool is not installed"; exit 77; }
-  done
-  if ! unshare --mount --net --pid --fork --mount-proc --propagation private true 2>/dev/null; then
-    echo "SKIP: private namespaces are not permitted here"
-    exit 77
-  fi
-  exec unshare --mount --net --pid --fork --mount-proc --propagation private "$0" --inside "$@"
+  require_tools unshare ip curl timeout
+  enter_private_namespaces "$0" "$@"
 fi
 shift
 
@@ -26,46 +23,9 @@ lib_dir=$(cd "$2" && pwd -P) || exit 1
 shift 2
 emulator=("$@")
 
-fail=0
-pass() { echo "PASS: $*"; }
-failed() { echo "FAIL: $*"; fail=1; }
-
-# Polls a command until it succeeds or the deadline (seconds) passes.
-wait_for() {
-  local deadline=$(($(date +%s) + $1))
-  shift
-  until "$@"; do
-    [ "$(date +%s)" -lt "$deadline" ] || return 1
-    sleep 0.1
-  done
-}
-
 # ---------------------------------------------------------------- private system
-# A build tree under /tmp or /run would vanish under the private tmpfs: bind its top folder
-# back at the same path.
-keep_tree() {
-  local top=$1 rel=${bin_dir#"$1"/}
-  [ "$rel" != "$bin_dir" ] || return 0
-  rel=${rel%%/*}
-  exec {old}<"$top"
-  mount -t tmpfs tmpfs "$top" || exit 1
-  mkdir -p "$top/$rel"
-  mount --no-canonicalize --bind "/proc/self/fd/$old/$rel" "$top/$rel" || exit 1
-  exec {old}<&-
-}
-for top in /tmp /run; do
-  case "$bin_dir" in
-    "$top"/*) keep_tree "$top" ;;
-    *) mount -t tmpfs tmpfs "$top" || exit 1 ;;
-  esac
-done
-work=/tmp/work
-mkdir -p "$work/etc"
-mount -t tmpfs tmpfs "$work/etc" && cp -a /etc/. "$work/etc/" && mount --bind "$work/etc" /etc ||
-  { echo "cannot make a private /etc" >&2; exit 1; }
-mkdir -p /etc/velmora/share
+make_private_system "$bin_dir"
 printf '[SYSTEMSETTINGS]\nHost_Name = e2e\n' >/etc/velmora/share/qv-rt.ini
-ip link set lo up
 
 socket=/tmp/qvPortableRegistry
 base=http://127.0.0.1:8080/qv_variable_iotolvane
