@@ -54,7 +54,7 @@ public:
         {
             std::lock_guard<std::mutex> lock(m_lock);
             ++m_nArmed;
-            m_nArmedAtMs = NowMs();
+            m_nArmedAtUs = NowUs();
             if (!m_bWatching) {
                 m_bWatching = true;
                 wake = true;
@@ -85,7 +85,7 @@ protected:
     void* Run() override {
         for (;;) {
             m_wakeUp.Wait();
-            uint32_t remainingMs;
+            uint64_t remainingUs;
             {
                 std::lock_guard<std::mutex> lock(m_lock);
                 if (m_bStopRequested) {
@@ -94,10 +94,10 @@ protected:
                 if (!m_bWatching) {
                     continue;
                 }
-                remainingMs = RemainingMs();
+                remainingUs = RemainingUs();
                 m_timerIo.reset();  // under the lock: a Stop's stop is never undone
             }
-            Wait(remainingMs);
+            Wait(remainingUs);
             boost::system::error_code error;
             m_timerIo.run(error);
             if (error) {
@@ -107,17 +107,21 @@ protected:
     }
 
 private:
-    uint32_t NowMs() const { return static_cast<uint32_t>(m_clock.Now(1000000)); }
+    // Microseconds, so that a deadline never passes early by the rounding of whole
+    // milliseconds; 64 bits of them do not wrap.
+    uint64_t NowUs() const { return m_clock.Now(1000); }
 
-    // Milliseconds until the latest call's deadline; unsigned, right across the wrap.
-    uint32_t RemainingMs() const {
-        const uint32_t elapsed = NowMs() - m_nArmedAtMs;
-        return elapsed >= m_nTimeoutMs ? 0 : m_nTimeoutMs - elapsed;
+    // Microseconds until the latest call's deadline.
+    uint64_t RemainingUs() const {
+        const uint64_t elapsed = NowUs() - m_nArmedAtUs;
+        const uint64_t timeout = uint64_t(m_nTimeoutMs) * 1000u;
+        return elapsed >= timeout ? 0 : timeout - elapsed;
     }
 
-    void Wait(uint32_t milliseconds) {
+    void Wait(uint64_t microseconds) {
         boost::system::error_code error;
-        m_timer.expires_from_now(boost::posix_time::milliseconds(milliseconds), error);
+        m_timer.expires_from_now(
+            boost::posix_time::microseconds(static_cast<int64_t>(microseconds)), error);
         if (error) {
             throw boost::system::system_error(error, "expires_from_now");
         }
@@ -137,9 +141,9 @@ private:
             m_bWatching = false;  // nothing in progress: the next Arm wakes the thread
             return;
         }
-        const uint32_t remainingMs = RemainingMs();
-        if (remainingMs != 0) {
-            Wait(remainingMs);  // a later call is in progress: watch its own deadline
+        const uint64_t remainingUs = RemainingUs();
+        if (remainingUs != 0) {
+            Wait(remainingUs);  // a later call is in progress: watch its own deadline
             return;
         }
         m_nCancelled = m_nArmed;  // flagged once
@@ -158,7 +162,7 @@ private:
     bool m_bWatching = false;  // the thread has, or is about to have, a deadline set
     uint32_t m_nArmed = 0;     // number of the latest call
     uint32_t m_nCancelled = 0;
-    uint32_t m_nArmedAtMs = 0;
+    uint64_t m_nArmedAtUs = 0;
 };
 
 }  // namespace rpc

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
 #include <functional>
 #include <stdexcept>
 
@@ -39,6 +40,35 @@ TEST(TimerThreadImpl, CancelEndsItsWatchEvenBeforeTheThreadWakes) {
     watchdog.Stop();
     watchdog.Join();
     EXPECT_EQ(deadlines.load(), 1);
+}
+
+TEST(TimerThreadImpl, ADeadlineNeverPassesBeforeItsTime) {
+    // Whole milliseconds of rounding must not shorten a watch: a call armed late in one
+    // millisecond still gets its full time-out.
+    using Clock = std::chrono::steady_clock;
+    std::atomic<int64_t> firedAtUs{0};
+    zil::osdep::Event passed;  // automatic reset: one wait per watch
+    Watchdog watchdog(
+        [&](const boost::system::error_code& error) {
+            if (!error) {
+                firedAtUs = std::chrono::duration_cast<std::chrono::microseconds>(
+                                Clock::now().time_since_epoch())
+                                .count();
+                passed.Set();
+            }
+        },
+        3);
+    watchdog.Start();
+    for (int i = 0; i < 40; ++i) {
+        const Clock::time_point armed = Clock::now();
+        watchdog.Arm();
+        ASSERT_TRUE(passed.Wait(10000));
+        const int64_t armedUs =
+            std::chrono::duration_cast<std::chrono::microseconds>(armed.time_since_epoch()).count();
+        EXPECT_GE(firedAtUs.load() - armedUs, 3000) << "watch " << i;
+    }
+    watchdog.Stop();
+    watchdog.Join();
 }
 
 TEST(TimerThreadImpl, AThrowingHandlerEndsOnlyTheWatchdogThread) {
