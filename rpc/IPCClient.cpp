@@ -35,7 +35,7 @@ using variable::remoteconfig::StatusRecord;
 
 namespace {
 
-constexpr uint64_t kMillisecond = 1000000;  // clock unit in nanoseconds
+constexpr uint64_t kMicrosecond = 1000;  // clock unit in nanoseconds
 
 template <typename Handler>
 IPCClient::TimerThread* MakeWatchdog(Handler handler, uint32_t timeoutMs) {
@@ -102,7 +102,7 @@ void IPCClient::Invoke(int32_t procedureId, zil::ByteString* parameters, uint32_
         return;
     }
     m_bTimedOut = false;
-    m_nStartMs = static_cast<uint32_t>(m_clock.Now(kMillisecond));
+    m_nStartUs = m_clock.Now(kMicrosecond);
     boost::asio::async_write(
         m_socket, boost::asio::buffer(m_frame.data(), m_frame.size()),
         boost::bind(&IPCClient::OnWriteComplete, this, boost::asio::placeholders::error));
@@ -155,8 +155,9 @@ bool IPCClient::EndsCall(const error_code& error) {
         m_pStatus->SetCode(StatusCodeFromSystemError(error));
         return true;
     }
-    const uint32_t now = static_cast<uint32_t>(m_clock.Now(kMillisecond));
-    if (now - m_nStartMs >= m_nTimeoutMs) {  // unsigned: right across the clock's wrap
+    // In microseconds, so that rounding to whole milliseconds never ends a call early;
+    // 64 bits of them do not wrap.
+    if (m_clock.Now(kMicrosecond) - m_nStartUs >= uint64_t(m_nTimeoutMs) * 1000u) {
         m_pStatus->SetCode(kTimedOut);
         return true;
     }

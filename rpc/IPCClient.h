@@ -98,7 +98,7 @@ private:
     uint32_t m_nCount = 0;
     zil::ByteString* m_pReturnValue = nullptr;
     variable::remoteconfig::StatusRecord* m_pStatus = nullptr;
-    uint32_t m_nStartMs = 0;
+    uint64_t m_nStartUs = 0;  // monotonic clock at the start of the call
     uint32_t m_nBodyLength = 0;
 };
 
