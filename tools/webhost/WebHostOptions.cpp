@@ -27,7 +27,10 @@ const char* WebHostOptions::Usage() {
            "Request variables come from the query string, an application/x-www-form-\n"
            "urlencoded body, then the headers (any case, '-' and '_' alike).\n"
            "  --plugin PATH       the plug-in (default: ../lib/libqv_variable_iotolvane.so\n"
-           "                      beside this executable)\n"
+           "                      beside this executable when present, else the one the\n"
+           "                      package installs, beside this executable at\n"
+           "      " QV_INSTALLED_PLUGIN_FROM_BINDIR
+           ")\n"
            "  --listen ADDR:PORT  address to listen on (default 127.0.0.1:8080; port 0\n"
            "                      picks a free port)\n"
            "  --threads N         request threads calling the plug-in (default 4, 1..256)\n"

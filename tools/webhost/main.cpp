@@ -23,7 +23,10 @@ namespace {
 
 using qv::devtools::WebHostOptions;
 
-// The plug-in built beside this executable: <prefix>/bin/qv-webhost -> <prefix>/lib/...
+// The plug-in beside this executable: in a build tree <out>/bin/qv-webhost ->
+// <out>/lib/libqv_variable_iotolvane.so; when that is absent, the installed layout of the
+// packages, /usr/bin/qv-webhost -> /usr/lib/<triplet>/qv-webservices/... (both relative to
+// the executable, so an installation unpacked under another root works as well).
 std::string DefaultPluginPath() {
     char self[4096];
     const ssize_t length = readlink("/proc/self/exe", self, sizeof self - 1);
@@ -32,7 +35,11 @@ std::string DefaultPluginPath() {
         const std::string path(self, static_cast<size_t>(length));
         directory = path.substr(0, path.rfind('/'));
     }
-    return directory + "/../lib/libqv_variable_iotolvane.so";
+    const std::string built = directory + "/../lib/libqv_variable_iotolvane.so";
+    if (access(built.c_str(), F_OK) == 0) {
+        return built;
+    }
+    return directory + "/" + QV_INSTALLED_PLUGIN_FROM_BINDIR;
 }
 
 bool SomethingListensOn(const std::string& path) {
