@@ -31,6 +31,10 @@ const Operation kOperations[] = {
     {"close_session", CloseSession},
 };
 
+// Room for the argument list of nearly every request, made once: growing the list step by
+// step copies every string read so far at each step.
+constexpr size_t kArgumentsReserved = 128;
+
 // The fixed answer after an exception: HTTP 500 and a body without TAB or code.
 void AnswerException(uint32_t handle, const char* body, uint32_t length) noexcept {
     SetHTTPResponseCode_QV_GXWS_(handle, 500);
@@ -77,6 +81,7 @@ void Plugin::InitLocked() {
     }
     zil::osdep::Mutex::ScopedLock lock(m_senderLock);
     m_pSender = std::move(sender);
+    m_bInitialised = true;
 }
 
 void Plugin::Finalize() noexcept {
@@ -89,6 +94,7 @@ void Plugin::Finalize() noexcept {
     {
         zil::osdep::Mutex::ScopedLock lock(m_senderLock);
         sender.swap(m_pSender);
+        m_bInitialised = false;
     }
 }
 
@@ -106,7 +112,7 @@ void Plugin::Run(IRequestContext* context, uint32_t handle) noexcept {
 void Plugin::Answer(IRequestContext* context, uint32_t handle) {
     StatusRecord status;
     zil::ByteString output;
-    if (IsInitialised()) {
+    if (m_bInitialised) {
         Dispatch(context, handle, output, status);
     } else {
         status.SetCode(kNotInitialised);
@@ -144,6 +150,7 @@ void Plugin::Dispatch(IRequestContext* context, uint32_t handle, zil::ByteString
         return;
     }
     ArgumentList arguments;
+    arguments.reserve(kArgumentsReserved);
     found->second(context, handle, arguments, status);
     SendUnderLock(arguments, operation, output, status);
 }

@@ -10,6 +10,7 @@
 // Run without a data sender answers -314899 with HTTP 500.
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -60,6 +61,10 @@ private:
     zil::osdep::Mutex m_initLock;
     zil::osdep::Mutex m_senderLock;          // guards m_pSender and every Send
     std::unique_ptr<IDataSender> m_pSender;  // null while not initialised
+    // Whether m_pSender is set, written under the sender lock: Run looks at it without
+    // taking that lock, so a request does not wait for another's Send before reading its
+    // variables (SendUnderLock still finds a Finalize that came in between).
+    std::atomic<bool> m_bInitialised{false};
 };
 
 }  // namespace remoteconfig

@@ -1,8 +1,8 @@
 #include "plugin/VariableReader.h"
 
 #include <climits>
-#include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <vector>
 
 #include "platform/ws_runtime/WsRuntime.h"
@@ -14,10 +14,8 @@ namespace remoteconfig {
 
 namespace {
 
-// Two runtime calls: the first with a null buffer asks for the size (value plus NUL, or 0
-// when absent); the second fills a string of exactly that many bytes, NUL included.
-bool ReadInto(uint32_t handle, zil::ByteString& destination, const char* name,
-              StatusRecord& status) {
+// True when a reader may ask the runtime for `name`; otherwise the code says why not.
+bool MayRead(const char* name, StatusRecord& status) {
     if (status.IsError()) {
         return false;
     }
@@ -25,55 +23,99 @@ bool ReadInto(uint32_t handle, zil::ByteString& destination, const char* name,
         status.SetCode(kVariableWithoutName);
         return false;
     }
+    return true;
+}
+
+// The first runtime call, with a null buffer: the value's size plus its NUL, or 0 (and
+// -356006) when the request has no such variable.
+uint32_t AskSize(uint32_t handle, const char* name, StatusRecord& status) {
     uint32_t size = 0;
     ReadRequestVariable_C_REST_QV_GXWS_(handle, name, nullptr, &size);
     if (size == 0) {
         status.SetCode(kVariableAbsent);
-        return false;
     }
+    return size;
+}
+
+// The second runtime call fills a string of exactly `size` bytes, NUL included.
+void Fill(uint32_t handle, const char* name, uint32_t size, zil::ByteString& destination) {
     destination.resize(size - 1);
     ReadRequestVariable_C_REST_QV_GXWS_(handle, name, destination.data(), &size);
-    return true;
+}
+
+// Appends a string of size - 1 bytes and fills it. A short value's string is made at its
+// final length in one allocation (from zero bytes), instead of growing an empty one.
+void AppendFilled(uint32_t handle, const char* name, uint32_t size, ArgumentList& arguments) {
+    static const char kZeros[256] = {};
+    if (size <= sizeof kZeros) {
+        arguments.emplace_back(kZeros, size - 1);
+    } else {
+        arguments.emplace_back();
+        arguments.back().resize(size - 1);
+    }
+    ReadRequestVariable_C_REST_QV_GXWS_(handle, name, arguments.back().data(), &size);
 }
 
 }  // namespace
 
 void ReadVariable(uint32_t handle, ArgumentList& arguments, const char* name,
                   StatusRecord& status) {
-    zil::ByteString value;
-    if (ReadInto(handle, value, name, status)) {
-        arguments.emplace_back();
-        arguments.back().swap(value);
+    if (!MayRead(name, status)) {
+        return;
     }
+    const uint32_t size = AskSize(handle, name, status);
+    if (size == 0) {
+        return;
+    }
+    // Filled in place at the end of the list: no second string and no swap per value.
+    AppendFilled(handle, name, size, arguments);
 }
 
 void ReadVariableInto(uint32_t handle, zil::ByteString& destination, const char* name,
                       StatusRecord& status) {
-    ReadInto(handle, destination, name, status);
+    if (!MayRead(name, status)) {
+        return;
+    }
+    const uint32_t size = AskSize(handle, name, status);
+    if (size != 0) {
+        Fill(handle, name, size, destination);
+    }
 }
 
 void ReadNumberedVariable(uint32_t handle, ArgumentList& arguments, const char* base, int32_t index,
                           StatusRecord& status) {
-    if (status.IsError()) {
+    if (!MayRead(base, status)) {
         return;
     }
-    if (base == nullptr) {
-        status.SetCode(kVariableWithoutName);
-        return;
+    // The name as "%s%ld" formats it, written by hand: snprintf cost more than the rest of
+    // the read. The index in decimal, a '-' first when negative.
+    char digits[12];
+    char* const digitsEnd = digits + sizeof digits;
+    char* first = digitsEnd;
+    uint32_t magnitude =
+        index < 0 ? 0u - static_cast<uint32_t>(index) : static_cast<uint32_t>(index);
+    do {
+        *--first = static_cast<char>('0' + magnitude % 10);
+        magnitude /= 10;
+    } while (magnitude != 0);
+    if (index < 0) {
+        *--first = '-';
     }
+    const size_t digitCount = static_cast<size_t>(digitsEnd - first);
+    const size_t baseLength = std::strlen(base);
     char name[36];
-    const int length = std::snprintf(name, sizeof name, "%s%ld", base, static_cast<long>(index));
-    if (length < 0) {
-        status.SetCode(kVariableWithoutName);
-        return;
-    }
-    if (static_cast<size_t>(length) < sizeof name) {
+    if (baseLength + digitCount < sizeof name) {
+        std::memcpy(name, base, baseLength);
+        std::memcpy(name + baseLength, first, digitCount);
+        name[baseLength + digitCount] = '\0';
         ReadVariable(handle, arguments, name, status);
         return;
     }
     // A base name longer than any in use: format it whole rather than cut it.
-    std::vector<char> longName(static_cast<size_t>(length) + 1);
-    std::snprintf(longName.data(), longName.size(), "%s%ld", base, static_cast<long>(index));
+    std::vector<char> longName(baseLength + digitCount + 1);
+    std::memcpy(longName.data(), base, baseLength);
+    std::memcpy(longName.data() + baseLength, first, digitCount);
+    longName[baseLength + digitCount] = '\0';
     ReadVariable(handle, arguments, longName.data(), status);
 }
 

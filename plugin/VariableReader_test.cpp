@@ -1,5 +1,6 @@
 #include "plugin/VariableReader.h"
 
+#include <climits>
 #include <string>
 #include <vector>
 
@@ -87,6 +88,20 @@ TEST(VariableReaderTest, NumberedNamesAndCounts) {
     EXPECT_THAT(Strings(list), ElementsAre("x", "p", "c"));
     EXPECT_THAT(request.NamesAsked(),
                 ElementsAre("child7", "parent0", "callingConvention2147483647"));
+
+    // Negative indices keep their sign, as "%s%ld" writes them; a base name too long for
+    // the 36-byte buffer is formatted whole, never cut.
+    const std::string longBase(40, 'n');
+    FakeRequest& more = FakeRuntime::Open(
+        5, {{"value-5", "m"}, {"id-2147483648", "i"}, {longBase + "12", "l"}, {"a0", "z"}});
+    ArgumentList other;
+    ReadNumberedVariable(5, other, "value", -5, status);
+    ReadNumberedVariable(5, other, "id", INT32_MIN, status);
+    ReadNumberedVariable(5, other, longBase.c_str(), 12, status);
+    ReadNumberedVariable(5, other, "a", 0, status);
+    EXPECT_EQ(status.code, 0);
+    EXPECT_THAT(Strings(other), ElementsAre("m", "i", "l", "z"));
+    EXPECT_THAT(more.NamesAsked(), ElementsAre("value-5", "id-2147483648", longBase + "12", "a0"));
 
     auto count = [](const char* text) { return CountOfLast(ArgumentList{text}); };
     EXPECT_EQ(count(" 3abc"), 3u);

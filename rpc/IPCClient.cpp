@@ -37,6 +37,10 @@ namespace {
 
 constexpr uint64_t kMicrosecond = 1000;  // clock unit in nanoseconds
 
+// The frame buffer is kept for the next call up to this size, so that ordinary calls do
+// not allocate it afresh each time.
+constexpr uint32_t kKeptFrameBytes = 64u * 1024u;
+
 template <typename Handler>
 IPCClient::TimerThread* MakeWatchdog(Handler handler, uint32_t timeoutMs) {
     return new IPCClient::TimerThreadImpl<Handler>(handler, timeoutMs);
@@ -124,7 +128,9 @@ void IPCClient::Invoke(int32_t procedureId, zil::ByteString* parameters, uint32_
         m_io.poll(ignored);
         status.SetCode(kTimedOut);
     }
-    m_frame = zil::ByteString();  // a large answer's buffer is not kept between calls
+    if (m_frame.capacity() > kKeptFrameBytes) {
+        m_frame = zil::ByteString();  // a large answer's buffer is not kept between calls
+    }
 }
 
 void IPCClient::WriteRequest(int32_t procedureId) {
@@ -212,8 +218,11 @@ void IPCClient::OnBodyRead(const error_code& error) {
     if (response.GetParameterCount() != m_nCount) {
         return;  // dropped without a code: the caller's parameters stay as sent
     }
+    // The parsed message is ours alone and dropped next: its strings are handed over
+    // rather than copied.
+    zil::ByteString* answers = response.GetParameters()->Strings();
     for (uint32_t i = 0; i < m_nCount; ++i) {
-        m_pParameters[i] = response.GetParameter(i);
+        m_pParameters[i].swap(answers[i]);
     }
     *m_pReturnValue = response.GetReturnValue();
 }

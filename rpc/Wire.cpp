@@ -91,14 +91,18 @@ uint32_t Wire::NarrowSize(const ByteString& text) {
 }
 
 void Wire::WriteNarrow(const ByteString& text, char*& cursor, const char* end) {
-    const uint32_t total = NarrowSize(text);
-    if (cursor > end || total > Remaining(cursor, end)) {
+    // One bounds check and one copy per item: an argument list writes one item per value.
+    const uint32_t room = Remaining(cursor, end);
+    const uint32_t length = text.size();
+    if (cursor > end || room < 5 || length > room - 5) {
         QV_THROW(BufferOverflow());
     }
-    WriteUInt32(text.size() + 1, cursor, end);
-    WriteField(text.data(), text.size(), cursor, end);
-    const char nul = 0;
-    WriteField(&nul, 1, cursor, end);
+    PokeUInt32(length + 1, cursor);
+    if (length != 0) {
+        std::memcpy(cursor + 4, text.data(), length);
+    }
+    cursor[4 + length] = '\0';
+    cursor += length + 5;
 }
 
 void Wire::ReadNarrow(ByteString& text, const char*& cursor, const char* end) {

@@ -87,6 +87,12 @@ TEST(Wire, NarrowStringBytesAndRejects) {
     char small[8];
     char* out = small;
     EXPECT_THROW(Wire::WriteNarrow("abc", out, small + 7), BufferOverflow);
+    EXPECT_EQ(out, small);  // nothing written, the cursor stays
+    EXPECT_THROW(Wire::WriteNarrow("", out, small + 4), BufferOverflow);
+    Wire::WriteNarrow("abc", out, small + 8);  // an exact fit
+    EXPECT_EQ(out, small + 8);
+    EXPECT_EQ(std::memcmp(small, "\4\0\0\0abc\0", 8), 0);
+    EXPECT_THROW(Wire::WriteNarrow("", out, small + 7), BufferOverflow);  // cursor past the end
     out = small + 6;
     EXPECT_THROW(Wire::WriteField("x", 0, out, small + 5), BufferOverflow);
 }
