@@ -18,17 +18,24 @@ char Fold(char c) {
 
 void RequestVariables::AddExact(std::string name, std::string value) {
     m_variables.push_back(Variable{std::move(name), std::move(value), false});
+    const Variable& added = m_variables.back();
+    try {
+        m_exact.emplace(std::string_view(added.name), &added.value);  // a repeat keeps the first
+    } catch (...) {
+        m_variables.pop_back();
+        throw;
+    }
 }
 
 void RequestVariables::AddHeader(std::string name, std::string value) {
     m_variables.push_back(Variable{std::move(name), std::move(value), true});
 }
 
-bool RequestVariables::HeaderMatches(const std::string& header, const std::string& name) {
+bool RequestVariables::HeaderMatches(std::string_view header, std::string_view name) {
     if (header.size() != name.size()) {
         return false;
     }
-    for (std::string::size_type i = 0; i < header.size(); ++i) {
+    for (std::string_view::size_type i = 0; i < header.size(); ++i) {
         if (Fold(header[i]) != Fold(name[i])) {
             return false;
         }
@@ -36,13 +43,11 @@ bool RequestVariables::HeaderMatches(const std::string& header, const std::strin
     return true;
 }
 
-const std::string* RequestVariables::Find(const std::string& name) const {
-    // Query and form variables come before headers in m_variables only if the host added
-    // them first; search the exact ones first whatever the order of adding.
-    for (const Variable& variable : m_variables) {
-        if (!variable.isHeader && variable.name == name) {
-            return &variable.value;
-        }
+const std::string* RequestVariables::Find(std::string_view name) const {
+    // The exact ones first, whatever the order of adding; then the headers in order.
+    const auto exact = m_exact.find(name);
+    if (exact != m_exact.end()) {
+        return exact->second;
     }
     for (const Variable& variable : m_variables) {
         if (variable.isHeader && HeaderMatches(variable.name, name)) {

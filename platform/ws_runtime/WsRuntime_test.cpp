@@ -28,6 +28,25 @@ TEST(RequestVariablesTest, SearchOrderAndHeaderMatching) {
     EXPECT_FALSE(RequestVariables::HeaderMatches("a.b", "a_b"));
 }
 
+TEST(RequestVariablesTest, RepeatedNamesKeepTheFirstAndManyStayFindable) {
+    RequestVariables variables;
+    variables.AddExact("value", "first");
+    for (int i = 0; i < 2000; ++i) {  // far past any growth step of the storage
+        variables.AddExact("value" + std::to_string(i), std::to_string(i));
+    }
+    variables.AddExact("value", "second");
+    EXPECT_EQ(*variables.Find("value"), "first");
+    for (int i = 0; i < 2000; ++i) {
+        const std::string* found = variables.Find("value" + std::to_string(i));
+        ASSERT_NE(found, nullptr) << i;
+        EXPECT_EQ(*found, std::to_string(i));
+    }
+    // A name with a NUL inside is its own name, not its prefix.
+    variables.AddExact(std::string("a\0b", 3), "nul");
+    EXPECT_EQ(variables.Find("a"), nullptr);
+    EXPECT_EQ(*variables.Find(std::string("a\0b", 3)), "nul");
+}
+
 TEST(RequestTableTest, RuntimeFunctionsFillTheRequestsOwnResponse) {
     RequestVariables variables;
     variables.AddExact("name", "hello");
