@@ -5,15 +5,22 @@
 // After the usual output the program prints the times side by side, the
 // ratios, and how loading grows from 10k to 100k keys; plus one lookup benchmark on the
 // largest single section.
+// Each benchmark runs in a child process of its own (fork), so that the heap left behind by
+// one case (pages glibc keeps or has given back, a raised mmap threshold) does not bend the
+// times of the next; --in_process runs them all in this process instead.
 #include <benchmark/benchmark.h>
 
 #include <INIReader.h>
 #include <ini.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <map>
+#include <regex>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -145,9 +152,19 @@ void LookupOurs(benchmark::State& state) {
     IniDestroy(store);
 }
 
-// Keeps the real time per iteration of every run, in milliseconds.
+// Keeps the real time per iteration of every run, in milliseconds; prints the context (machine,
+// load) only while printContext is set, so that children print it once between them.
 class CollectingReporter : public benchmark::ConsoleReporter {
 public:
+    bool printContext = true;
+    size_t nameWidth = 0;  // the same columns in every child
+
+    bool ReportContext(const Context& context) override {
+        const bool ok = printContext ? ConsoleReporter::ReportContext(context) : true;
+        name_field_width_ = std::max(nameWidth, context.name_field_width);
+        printed_header_ = !printContext;
+        return ok;
+    }
     void ReportRuns(const std::vector<Run>& runs) override {
         ConsoleReporter::ReportRuns(runs);
         for (const Run& run : runs) {
@@ -155,26 +172,85 @@ public:
             if ((aggregate && run.aggregate_name != "median") || run.error_occurred) {
                 continue;
             }
-            m_ms[run.run_name.function_name] =
-                run.GetAdjustedRealTime() / benchmark::GetTimeUnitMultiplier(run.time_unit) * 1e3;
+            const double toMs = 1e3 / benchmark::GetTimeUnitMultiplier(run.time_unit);
+            m_ms[run.run_name.function_name] = {run.GetAdjustedRealTime() * toMs,
+                                                run.GetAdjustedCPUTime() * toMs};
         }
     }
-    double Ms(const std::string& name) const {
+    // Real (wall-clock) and CPU time per load of a benchmark, 0 when it did not run.
+    struct Times {
+        double real = 0.0;
+        double cpu = 0.0;
+    };
+    Times Get(const std::string& name) const {
         auto found = m_ms.find(name);
-        return found == m_ms.end() ? 0.0 : found->second;
+        return found == m_ms.end() ? Times{} : found->second;
     }
+    double Ms(const std::string& name) const { return Get(name).real; }
+    void Set(const std::string& name, Times times) { m_ms[name] = times; }
 
 private:
-    std::map<std::string, double> m_ms;
+    std::map<std::string, Times> m_ms;
 };
 
 std::string Name(const char* who, const char* layout, int keys) {
     return std::string("load/") + who + "/" + layout + "/" + std::to_string(keys);
 }
 
+// Runs the one benchmark called name in a child process and takes its time into reporter;
+// false when the child failed.
+bool RunIsolated(const std::string& name, CollectingReporter* reporter) {
+    int channel[2];
+    if (::pipe(channel) != 0) {
+        return false;
+    }
+    std::fflush(stdout);
+    const pid_t child = ::fork();
+    if (child < 0) {
+        ::close(channel[0]);
+        ::close(channel[1]);
+        return false;
+    }
+    if (child == 0) {
+        ::close(channel[0]);
+        benchmark::RunSpecifiedBenchmarks(reporter, "^" + name + "$");
+        const CollectingReporter::Times times = reporter->Get(name);
+        const bool sent =
+            ::write(channel[1], &times, sizeof times) == static_cast<ssize_t>(sizeof times);
+        std::fflush(stdout);
+        ::_exit(sent ? 0 : 1);  // no static destructors: the parent owns the generated files
+    }
+    ::close(channel[1]);
+    CollectingReporter::Times times;
+    const bool received =
+        ::read(channel[0], &times, sizeof times) == static_cast<ssize_t>(sizeof times);
+    ::close(channel[0]);
+    int status = 0;
+    while (::waitpid(child, &status, 0) < 0) {
+    }
+    if (received && WIFEXITED(status) && WEXITSTATUS(status) == 0) {
+        reporter->Set(name, times);
+        reporter->printContext = false;
+        return true;
+    }
+    return false;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
+    // Our one flag; the rest are Google Benchmark's.
+    bool inProcess = false;
+    int kept = 1;
+    for (int i = 1; i < argc; ++i) {
+        if (std::strcmp(argv[i], "--in_process") == 0) {
+            inProcess = true;
+        } else {
+            argv[kept++] = argv[i];
+        }
+    }
+    argc = kept;
+    std::vector<std::string> names;
     for (const char* layout : kLayouts) {
         for (int keys : kSizes) {
             const std::string path = TheFiles().Path(layout, keys);
@@ -188,16 +264,34 @@ int main(int argc, char** argv) {
                 ->Unit(benchmark::kMillisecond);
             benchmark::RegisterBenchmark(Name("bare", layout, keys).c_str(), LoadBare, path)
                 ->Unit(benchmark::kMillisecond);
+            for (const char* who : {"ours", "ours-reload", "INIReader", "bare"}) {
+                names.push_back(Name(who, layout, keys));
+            }
         }
     }
     benchmark::RegisterBenchmark("lookup/ours/single/100000", LookupOurs);
+    names.push_back("lookup/ours/single/100000");
 
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv)) {
         return 1;
     }
     CollectingReporter reporter;
-    benchmark::RunSpecifiedBenchmarks(&reporter);
+    for (const std::string& name : names) {
+        reporter.nameWidth = std::max(reporter.nameWidth, name.size() + 8);  // + "_median"
+    }
+    if (inProcess) {
+        benchmark::RunSpecifiedBenchmarks(&reporter);
+    } else {
+        std::string filter = benchmark::GetBenchmarkFilter();
+        const std::regex selected(filter.empty() || filter == "all" ? "." : filter);
+        for (const std::string& name : names) {
+            if (std::regex_search(name, selected) && !RunIsolated(name, &reporter)) {
+                std::fprintf(stderr, "%s: the child process failed\n", name.c_str());
+                return 1;
+            }
+        }
+    }
     benchmark::Shutdown();
 
     std::printf("\n%-18s %10s %10s %12s %10s %10s %10s\n", "file", "ours ms", "reload ms",
@@ -216,13 +310,16 @@ int main(int argc, char** argv) {
                         reader, bare, ours / reader, ours / bare);
         }
     }
-    std::printf("\ngrowth 10k -> 100k keys (linear is 10x)\n");
+    // CPU time beside real time: on a busy machine the wall clock also counts the time the
+    // process waited for a core, which says nothing about how loading grows.
+    std::printf("\ngrowth 10k -> 100k keys (linear is 10x)  real     cpu\n");
     for (const char* layout : kLayouts) {
         for (const char* who : {"ours", "ours-reload", "INIReader", "bare"}) {
-            const double small = reporter.Ms(Name(who, layout, 10000));
-            const double large = reporter.Ms(Name(who, layout, 100000));
-            if (small > 0.0 && large > 0.0) {
-                std::printf("%-10s %-10s %6.2fx\n", layout, who, large / small);
+            const auto small = reporter.Get(Name(who, layout, 10000));
+            const auto large = reporter.Get(Name(who, layout, 100000));
+            if (small.real > 0.0 && large.real > 0.0 && small.cpu > 0.0) {
+                std::printf("%-10s %-28s %6.2fx %6.2fx\n", layout, who, large.real / small.real,
+                            large.cpu / small.cpu);
             }
         }
     }

@@ -45,7 +45,7 @@ bool ReadMagnitude(std::string_view text, bool* negative, uint64_t* magnitude) {
 // The key, or null when absent; *blank tells whether its value is only white space.
 Key* FindForNumber(IniStore* store, const char* section, const char* key, bool* blank) {
     Key* found = store->FindKey(section, key);
-    *blank = found && qv_ini::Trim(found->value).empty();
+    *blank = found && qv_ini::Trim(found->Value()).empty();
     return found;
 }
 
@@ -84,7 +84,7 @@ int HexDigit(char c) {
 }
 
 // Decodes the value into the scratch buffer; its length through *length.
-int DecodeEscaped(IniStore* store, const std::string& value, size_t* length) {
+int DecodeEscaped(IniStore* store, std::string_view value, size_t* length) {
     const size_t need = value.size() + 1;
     if (store->scratchSize < need || store->scratchSize > need + 1024) {
         size_t size = need > 256 ? need : 256;
@@ -136,7 +136,7 @@ int IniGetInt(IniStore* store, const char* section, const char* key, int32_t* va
     }
     bool negative = false;
     uint64_t magnitude = 0;
-    if (!ReadMagnitude(found->value, &negative, &magnitude) ||
+    if (!ReadMagnitude(found->Value(), &negative, &magnitude) ||
         magnitude > (negative ? 2147483648u : 2147483647u)) {
         return kIniNotInt;
     }
@@ -153,7 +153,7 @@ int IniGetUnsigned(IniStore* store, const char* section, const char* key, uint32
     }
     bool negative = false;
     uint64_t magnitude = 0;
-    if (!ReadMagnitude(found->value, &negative, &magnitude) || negative) {
+    if (!ReadMagnitude(found->Value(), &negative, &magnitude) || negative) {
         return kIniNotUnsigned;
     }
     *value = static_cast<uint32_t>(magnitude);
@@ -167,7 +167,7 @@ int IniGetDouble(IniStore* store, const char* section, const char* key, double* 
         return 0;
     }
     auto same = qv_ini::SameName;
-    std::string_view name = qv_ini::Trim(found->value);
+    std::string_view name = qv_ini::Trim(found->Value());
     if (same(name, "Inf") || same(name, "+Inf")) {
         *value = std::numeric_limits<double>::infinity();
         return 1;
@@ -176,11 +176,11 @@ int IniGetDouble(IniStore* store, const char* section, const char* key, double* 
         *value = -std::numeric_limits<double>::infinity();
         return 1;
     }
-    const char* text = found->value.c_str();
+    const char* text = found->ValueText();
     char* end = nullptr;
     errno = 0;
     double parsed = std::strtod(text, &end);
-    if (errno != 0 || end != text + found->value.size()) {
+    if (errno != 0 || end != text + found->valueLength) {
         return kIniNotDouble;
     }
     *value = parsed;
@@ -194,7 +194,7 @@ int IniGetBool(IniStore* store, const char* section, const char* key, bool* valu
         return 0;
     }
     auto same = qv_ini::SameName;
-    std::string_view name = qv_ini::Trim(found->value);
+    std::string_view name = qv_ini::Trim(found->Value());
     if (same(name, "True") || same(name, "False")) {
         *value = same(name, "True");
         return 1;
@@ -208,13 +208,13 @@ int IniGetString(IniStore* store, const char* section, const char* key, char* bu
     if (!found) {
         return 0;
     }
-    CopyBounded(found->value, buffer, size);
+    CopyBounded(found->Value(), buffer, size);
     return 1;
 }
 
 int IniGetStringDup(IniStore* store, const char* section, const char* key, char** copy) {
     Key* found = store->FindKey(section, key);
-    return found ? Duplicate(found->value, copy) : 0;
+    return found ? Duplicate(found->Value(), copy) : 0;
 }
 
 int IniGetEscaped(IniStore* store, const char* section, const char* key, const char** text) {
@@ -223,7 +223,7 @@ int IniGetEscaped(IniStore* store, const char* section, const char* key, const c
         return 0;
     }
     size_t length = 0;
-    int rc = DecodeEscaped(store, found->value, &length);
+    int rc = DecodeEscaped(store, found->Value(), &length);
     if (rc == 1) {
         *text = store->scratch.get();
     }
@@ -238,7 +238,7 @@ int IniGetEscapedString(IniStore* store, const char* section, const char* key, c
         return 0;
     }
     size_t length = 0;
-    int rc = DecodeEscaped(store, found->value, &length);
+    int rc = DecodeEscaped(store, found->Value(), &length);
     if (rc == 1) {
         CopyBounded(std::string_view(store->scratch.get(), length), buffer, size);
     }
@@ -251,6 +251,6 @@ int IniGetEscapedDup(IniStore* store, const char* section, const char* key, char
         return 0;
     }
     size_t length = 0;
-    int rc = DecodeEscaped(store, found->value, &length);
+    int rc = DecodeEscaped(store, found->Value(), &length);
     return rc == 1 ? Duplicate(std::string_view(store->scratch.get(), length), copy) : rc;
 }

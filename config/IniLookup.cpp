@@ -31,7 +31,7 @@ int IniGetValue(IniStore* store, const char* section, const char* key, const cha
     if (!found) {
         return 0;
     }
-    *value = found->value.c_str();
+    *value = found->ValueText();
     return 1;
 }
 
@@ -66,7 +66,7 @@ int IniKeyName(IniStore* store, const char* section, int position, const char** 
     if (!key) {
         return 0;
     }
-    *name = key->name.c_str();
+    *name = key->NameText();
     return 1;
 }
 
@@ -75,6 +75,6 @@ int IniKeyValue(IniStore* store, const char* section, int position, const char**
     if (!key) {
         return 0;
     }
-    *value = key->value.c_str();
+    *value = key->ValueText();
     return 1;
 }

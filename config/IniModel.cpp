@@ -6,12 +6,6 @@
 #include <cstring>
 
 namespace qv_ini {
-namespace {
-
-// Keys beyond this count get a hash index; smaller sections are scanned.
-constexpr size_t kIndexThreshold = 16;
-
-}  // namespace
 
 std::string_view TrimRight(std::string_view text) {
     size_t end = text.size();
@@ -30,10 +24,15 @@ std::string_view Trim(std::string_view text) {
 }
 
 Key* Section::Find(std::string_view trimmedName, size_t* position) {
-    const uint32_t hash = HashName(trimmedName);
     if (!indexed) {
+        // Names that differ mostly differ in length or in the last character (numbered keys),
+        // so those are compared first.
+        const size_t size = trimmedName.size();
+        const unsigned char last = size ? Upper(trimmedName[size - 1]) : 0;
         for (size_t i = 0; i < keys.size(); ++i) {
-            if (keys[i]->hash == hash && SameName(keys[i]->name, trimmedName)) {
+            const Key& key = *keys[i];
+            if (key.nameLength == size && (size == 0 || Upper(key.text[size - 1]) == last) &&
+                SameName(key.Name(), trimmedName)) {
                 if (position) {
                     *position = i;
                 }
@@ -42,37 +41,25 @@ Key* Section::Find(std::string_view trimmedName, size_t* position) {
         }
         return nullptr;
     }
-    Key* found = index.Find(trimmedName, hash);
-    if (found && position) {
-        for (size_t i = 0; i < keys.size(); ++i) {
-            if (keys[i] == found) {
-                *position = i;
-                break;
-            }
-        }
+    const size_t found = index.Find(keys, trimmedName, HashName(trimmedName));
+    if (found == NameTable::kAbsent) {
+        return nullptr;
     }
-    return found;
+    if (position) {
+        *position = found;
+    }
+    return keys[found];
 }
 
 Key* Section::Append(std::string_view name, std::string_view value, int32_t line, int quote) {
-    Key* key = pool->Make();
-    try {
-        key->name.assign(name);
-        key->hash = HashName(key->name);
-        key->value.assign(value);
-        key->line = line;
-        key->quote = quote;
-        if (keys.empty()) {
-            keys.reserve(8);
-        }
-        keys.push_back(key);
-    } catch (...) {
-        pool->Recycle(key);
-        throw;
+    if (keys.capacity() == keys.size()) {
+        keys.reserve(keys.empty() ? 8 : keys.size() * 2);
     }
+    Key* key = pool->Make(name, value, line, quote);
+    keys.push_back(key);  // cannot throw: there is room
     try {
         if (indexed) {
-            index.Insert(key);  // keeps an earlier key of the same name
+            index.Insert(keys, keys.size() - 1);  // keeps an earlier key of the same name
         } else if (keys.size() > kIndexThreshold) {
             Reindex();
         }
@@ -84,26 +71,55 @@ Key* Section::Append(std::string_view name, std::string_view value, int32_t line
     return key;
 }
 
-void Section::Erase(size_t position) {
-    Key* gone = keys[position];
-    if (indexed && index.Erase(gone)) {
-        for (size_t i = position + 1; i < keys.size(); ++i) {
-            if (SameName(keys[i]->name, gone->name)) {
-                index.Insert(keys[i]);
-                break;
-            }
+Key* Section::AppendWhileReading(std::string_view name, std::string_view value, int32_t line,
+                                 int quote) {
+    if (keys.capacity() == keys.size()) {
+        keys.reserve(keys.empty() ? 8 : keys.size() * 2);
+    }
+    Key* key = pool->Make(name, value, line, quote);
+    keys.push_back(key);  // cannot throw: there is room
+    return key;
+}
+
+void Section::FinishReading() {
+    if (keys.size() <= kIndexThreshold) {
+        return;  // read key by key: no duplicates
+    }
+    index.Clear();
+    indexed = false;
+    NameTable fresh;
+    fresh.Reserve(keys.size());
+    size_t kept = 0;
+    for (Key* key : keys) {
+        keys[kept] = key;
+        const size_t first = fresh.Insert(keys, kept);  // no allocation: reserved
+        if (first == kept) {
+            ++kept;
+        } else {
+            pool->MoveValue(key, keys[first]);
         }
     }
+    keys.resize(kept);
+    index = std::move(fresh);
+    indexed = true;
+}
+
+void Section::Erase(size_t position) {
+    if (indexed) {
+        index.Remove(keys, position);
+    }
+    Key* gone = keys[position];
     keys.erase(keys.begin() + static_cast<std::ptrdiff_t>(position));
     pool->Recycle(gone);
 }
 
 void Section::Reindex() {
     try {
-        NameTable<Key> fresh;
+        NameTable fresh;
         if (keys.size() > kIndexThreshold) {
-            for (const auto& key : keys) {
-                fresh.Insert(key);
+            fresh.Reserve(keys.size());
+            for (size_t i = 0; i < keys.size(); ++i) {
+                fresh.Insert(keys, i);
             }
         }
         index = std::move(fresh);
@@ -124,11 +140,12 @@ Section* IniStore::FindSection(std::string_view trimmedName) {
     if (current && current->hash == hash && qv_ini::SameName(current->name, trimmedName)) {
         return current;
     }
-    Section* found = sectionIndex.Find(trimmedName, hash);
-    if (found) {
-        current = found;
+    const size_t found = sectionIndex.Find(sections, trimmedName, hash);
+    if (found == qv_ini::NameTable::kAbsent) {
+        return nullptr;
     }
-    return found;
+    current = sections[found].get();
+    return current;
 }
 
 Section* IniStore::FindSection(const char* name) {
@@ -144,7 +161,7 @@ Section* IniStore::AppendSection(std::string_view name, int32_t line) {
     Section* raw = section.get();
     sections.push_back(std::move(section));
     try {
-        sectionIndex.Insert(raw);
+        sectionIndex.Insert(sections, sections.size() - 1);
     } catch (...) {
         sections.pop_back();
         throw;
@@ -154,23 +171,20 @@ Section* IniStore::AppendSection(std::string_view name, int32_t line) {
 
 void IniStore::EraseSection(size_t position) {
     Section* gone = sections[position].get();
-    qv_ini::NameTable<Section> fresh = BuildSectionIndex(gone);
     if (current == gone) {
         current = nullptr;
     }
+    sectionIndex.Remove(sections, position);
     for (qv_ini::Key* key : gone->keys) {
         keyPool.Recycle(key);
     }
     sections.erase(sections.begin() + static_cast<std::ptrdiff_t>(position));
-    sectionIndex = std::move(fresh);
 }
 
-qv_ini::NameTable<Section> IniStore::BuildSectionIndex(const Section* without) const {
-    qv_ini::NameTable<Section> fresh;
-    for (const auto& section : sections) {
-        if (section.get() != without) {
-            fresh.Insert(section.get());
-        }
+qv_ini::NameTable IniStore::BuildSectionIndex() const {
+    qv_ini::NameTable fresh;
+    for (size_t i = 0; i < sections.size(); ++i) {
+        fresh.Insert(sections, i);
     }
     return fresh;
 }

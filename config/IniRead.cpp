@@ -75,20 +75,22 @@ void ParseKeyLine(IniStore* store, std::string_view line, int32_t lineNumber) {
             }
         }
     }
-    Key* key = store->current->Find(name);
+    // Beyond kIndexThreshold keys, FinishReading merges repeated names.
+    Section* section = store->current;
+    Key* key = section->keys.size() <= qv_ini::kIndexThreshold ? section->Find(name) : nullptr;
     if (key) {
-        key->value.assign(value);
+        store->keyPool.SetValue(key, value);
         key->line = lineNumber;
         key->quote = quote;
     } else {
-        store->current->Append(name, value, lineNumber, quote);
+        section->AppendWhileReading(name, value, lineNumber, quote);
     }
 }
 
 // The base name length of a continuation key and its number, or false.
-bool ContinuationOf(const std::string& name, size_t* baseLength, int32_t* number) {
+bool ContinuationOf(std::string_view name, size_t* baseLength, int32_t* number) {
     size_t at = name.find(" Line");
-    if (at == std::string::npos || at + 5 == name.size()) {
+    if (at == std::string_view::npos || at + 5 == name.size()) {
         return false;
     }
     int64_t value = 0;
@@ -102,35 +104,36 @@ bool ContinuationOf(const std::string& name, size_t* baseLength, int32_t* number
             return false;
         }
     }
-    *baseLength = at;
+    // Names are kept trimmed: "Path  Line0001" joins into "Path", not "Path ".
+    *baseLength = qv_ini::TrimRight(name.substr(0, at)).size();
     *number = static_cast<int32_t>(value);
     return true;
 }
 
-void JoinContinuations(Section* section) {
+void JoinContinuations(Section* section, std::string* joinedValue) {
     bool joined = false;
     auto& keys = section->keys;
     size_t i = 0;
     while (i < keys.size()) {
         size_t baseLength = 0;
         int32_t number = 0;
-        if (!ContinuationOf(keys[i]->name, &baseLength, &number) || number != 1) {
+        if (!ContinuationOf(keys[i]->Name(), &baseLength, &number) || number != 1) {
             ++i;
             continue;
         }
         size_t end = i + 1;
         size_t nextBase = 0;
         int32_t nextNumber = 0;
-        while (end < keys.size() && ContinuationOf(keys[end]->name, &nextBase, &nextNumber) &&
+        while (end < keys.size() && ContinuationOf(keys[end]->Name(), &nextBase, &nextNumber) &&
                nextNumber != 1) {
             ++end;
         }
         Key& first = *keys[i];
+        joinedValue->assign(first.Value());
         for (size_t k = i + 1; k < end; ++k) {
-            first.value += keys[k]->value;
+            joinedValue->append(keys[k]->Value());
         }
-        first.name.resize(baseLength);
-        first.hash = qv_ini::HashName(first.name);
+        section->pool->SetText(&first, first.Name().substr(0, baseLength), *joinedValue);
         for (size_t k = i + 1; k < end; ++k) {
             section->pool->Recycle(keys[k]);
         }
@@ -168,10 +171,13 @@ int Parse(IniStore* store, LineReader* reader) {
     if (rc < 0) {
         return rc;
     }
+    std::string joinedValue;
     for (auto& section : store->sections) {
-        JoinContinuations(section.get());
+        section->FinishReading();
+        JoinContinuations(section.get(), &joinedValue);
     }
     store->keyPool.Trim();
+    store->keyPool.Compact();
     return 0;
 }
 

@@ -15,7 +15,7 @@ void AppendPiece(std::string* out, const Key& key, const char* separator, int co
                  std::string_view piece) {
     char number[16];
     std::snprintf(number, sizeof number, "%04d", counter);
-    *out += key.name;
+    *out += key.Name();
     *out += " Line";
     *out += number;
     *out += separator;
@@ -29,39 +29,60 @@ void AppendPiece(std::string* out, const Key& key, const char* separator, int co
     *out += '\n';
 }
 
+// True when the reader would take the piece for a quoted value.
+bool EnclosedInQuotes(std::string_view piece) {
+    return piece.size() >= 2 && (piece.front() == '"' || piece.front() == '\'') &&
+           piece.back() == piece.front();
+}
+
 // The end of the next piece of value starting at begin, or begin when no piece fits.
 size_t PieceEnd(const IniStore& store, const Key& key, size_t begin, size_t allowance) {
-    const std::string& value = key.value;
+    const std::string_view value = key.Value();
+    size_t end;
     if (value.size() - begin <= allowance) {
-        return value.size();
-    }
-    size_t end = begin + allowance;
-    if (store.breakCharacter) {
-        size_t at = std::string_view(value).substr(begin, allowance).rfind(store.breakCharacter);
-        if (at != std::string_view::npos) {
-            end = begin + at + 1;
+        if (key.quote || !EnclosedInQuotes(value.substr(begin))) {
+            return value.size();
+        }
+        end = value.size() - 1;  // the rest fits, but would read back as a quoted value
+    } else {
+        end = begin + allowance;
+        if (store.breakCharacter) {
+            size_t at =
+                std::string_view(value).substr(begin, allowance).rfind(store.breakCharacter);
+            if (at != std::string_view::npos) {
+                end = begin + at + 1;
+            }
         }
     }
     if (!key.quote) {
-        // Reading trims every piece: an unquoted piece must not begin or end in white space.
-        while (end > begin && (qv_ini::IsSpace(value[end - 1]) || qv_ini::IsSpace(value[end]))) {
+        // Reading trims every piece and strips the quotes of a piece enclosed in them: an
+        // unquoted piece must not begin or end in white space, nor begin and end with the
+        // same quote character.
+        while (end > begin && (qv_ini::IsSpace(value[end - 1]) || qv_ini::IsSpace(value[end]) ||
+                               EnclosedInQuotes(value.substr(begin, end - begin)))) {
             --end;
         }
     }
     return end;
 }
 
+// True when the text begins with bytes that the reader takes for a byte order mark.
+bool StartsLikeMark(const std::string& text) {
+    return text.compare(0, 3, "\xEF\xBB\xBF") == 0 || text.compare(0, 2, "\xFF\xFE") == 0 ||
+           text.compare(0, 2, "\xFE\xFF") == 0;
+}
+
 int AppendKey(std::string* out, const IniStore& store, const Key& key, const char* separator,
               size_t separatorLength) {
     const size_t quotes = key.quote ? 2 : 0;
-    const size_t length = key.name.size() + separatorLength + key.value.size() + quotes;
+    const size_t length = key.Name().size() + separatorLength + key.Value().size() + quotes;
     if (store.maxLineLength < 0 || length <= static_cast<size_t>(store.maxLineLength)) {
-        *out += key.name;
+        *out += key.Name();
         *out += separator;
         if (key.quote) {
             *out += static_cast<char>(key.quote);
         }
-        *out += key.value;
+        *out += key.Value();
         if (key.quote) {
             *out += static_cast<char>(key.quote);
         }
@@ -69,18 +90,18 @@ int AppendKey(std::string* out, const IniStore& store, const Key& key, const cha
         return 0;
     }
     const int64_t allowance = static_cast<int64_t>(store.maxLineLength) - 12 -
-                              static_cast<int64_t>(key.name.size()) - static_cast<int64_t>(quotes);
+                              static_cast<int64_t>(key.Name().size()) -
+                              static_cast<int64_t>(quotes);
     if (allowance <= 0) {
         return kIniCannotSplit;
     }
     int counter = 1;
-    for (size_t begin = 0; begin < key.value.size(); ++counter) {
+    for (size_t begin = 0; begin < key.Value().size(); ++counter) {
         size_t end = PieceEnd(store, key, begin, static_cast<size_t>(allowance));
         if (end == begin) {
             return kIniCannotSplit;
         }
-        AppendPiece(out, key, separator, counter,
-                    std::string_view(key.value).substr(begin, end - begin));
+        AppendPiece(out, key, separator, counter, key.Value().substr(begin, end - begin));
         begin = end;
     }
     return 0;
@@ -122,6 +143,12 @@ int Serialize(const IniStore& store, std::string* out) {
         if (!(compact && (fromFile || section.name == kNullSection))) {
             *out += '\n';
         }
+    }
+    // A headerless "(null)" section whose first key begins with such bytes would lose them
+    // on reading (EF BB BF is skipped) or make the file unreadable (FF FE and FE FF give
+    // -3): the UTF-8 mark in front is the one the reader skips, and the key stays whole.
+    if (!(flags & kIniWriteBom) && StartsLikeMark(*out)) {
+        out->insert(0, "\xEF\xBB\xBF");
     }
     return 0;
 }

@@ -69,11 +69,12 @@ int IniSetValue(IniStore* store, const char* section, const char* key, const cha
         }
         Key* existing = found->Find(keyName);
         if (existing) {
-            existing->value.assign(text);
+            store->keyPool.SetValue(existing, text);
             existing->quote = quoteCharacter;
         } else {
             found->Append(keyName, text, -1, quoteCharacter);
         }
+        store->keyPool.Compact();
         return 1;
     });
 }
@@ -115,6 +116,7 @@ int IniDeleteKey(IniStore* store, const char* section, const char* key) {
         return 0;
     }
     found->Erase(position);
+    store->keyPool.Compact();
     return 1;
 }
 
@@ -125,10 +127,9 @@ int IniDeleteSection(IniStore* store, const char* section) {
     }
     for (size_t i = 0; i < store->sections.size(); ++i) {
         if (store->sections[i].get() == found) {
-            return qv_ini::NoThrow([&] {
-                store->EraseSection(i);
-                return 1;
-            });
+            store->EraseSection(i);
+            store->keyPool.Compact();
+            return 1;
         }
     }
     return 0;

@@ -205,3 +205,53 @@ TEST(IniWrite, StreamsAndChangeCheck) {
     ASSERT_EQ(::unlink(path.c_str()), 0);
     EXPECT_EQ(IniFileChanged(s), kIniInvalid);
 }
+
+// Files the writer makes must read back into the same store (cases found by the INI
+// round-trip fuzz target, fuzz/ini_roundtrip_fuzz.cpp).
+TEST(IniWrite, WrittenFilesReadBackToTheSameStore) {
+    TempDir dir;
+    const std::string path = dir.File("r.ini");
+    const char* value = nullptr;
+
+    // An unquoted value cut into pieces: no piece may begin and end with one quote
+    // character, or reading strips them. Cut at 7 bytes, "\"alpha\"" would be the first
+    // piece of one value and "'xyz'" the last piece of the other.
+    for (const std::string text : {"\"alpha\"1234567abcdefg", "1234567abcdefg'xyz'"}) {
+        Store store = NewStore(0x06);
+        IniSetValue(store.get(), "S", "k", text.c_str(), 0);
+        IniSetWriteOptions(store.get(), 20, 0, 0);
+        ASSERT_EQ(IniWriteFile(store.get(), path.c_str()), 0);
+        EXPECT_NE(ReadAll(path).find("k Line0002="), std::string::npos);
+        Store reread = NewStore(0x06);
+        ASSERT_EQ(IniLoadFile(reread.get(), path.c_str()), 0);
+        ASSERT_EQ(IniGetValue(reread.get(), "S", "k", &value), 1);
+        EXPECT_EQ(value, text);
+    }
+
+    // Continuation keys with blanks before " Line" join under the trimmed base name, so the
+    // key is found by its name and writes back as it was read.
+    {
+        WriteAll(path, "[S]\nPath  Line0001=/usr\nPath\t Line0002=/local\n");
+        Store store = NewStore();
+        ASSERT_EQ(IniLoadFile(store.get(), path.c_str()), 0);
+        ASSERT_EQ(IniGetValue(store.get(), "S", "Path", &value), 1);
+        EXPECT_EQ(std::string(value), "/usr/local");
+        ASSERT_EQ(IniKeyName(store.get(), "S", 1, &value), 1);
+        EXPECT_EQ(std::string(value), "Path");
+        IniSetWriteOptions(store.get(), -1, 0, 0);
+        ASSERT_EQ(IniWriteFile(store.get(), path.c_str()), 0);
+        EXPECT_EQ(ReadAll(path), "[S]\nPath=/usr/local\n\n");
+    }
+
+    // A header-less "(null)" section whose first key begins with the bytes of a byte order
+    // mark: FF FE made the file unreadable (-3), EF BB BF was skipped and the key renamed.
+    for (const char* key : {"\xFF\xFEkey", "\xFE\xFFkey", "\xEF\xBB\xBFkey"}) {
+        Store store = NewStore(0x08);
+        IniSetValue(store.get(), "(null)", key, "v", 0);
+        IniSetWriteOptions(store.get(), -1, 0, 0);
+        ASSERT_EQ(IniWriteFile(store.get(), path.c_str()), 0);
+        Store reread = NewStore(0x08);
+        ASSERT_EQ(IniLoadFile(reread.get(), path.c_str()), 0);
+        EXPECT_EQ(Dump(reread.get()), "[(null)] @-1\n" + std::string(key) + "=v @1\n");
+    }
+}
