@@ -271,15 +271,8 @@ std::vector<char> RandomText(std::mt19937& random) {
                                          "\xF8\x88\x80\x80\x80",
                                          "\xFD\xBF\xBF\xBF\xBF\xBF",
                                          "\xED\xA0\x80"};
-    static const char* const bad[] = {"\x80",
-                                      "\xC0\xAF",
-                                      "\xC1\xBF",
-                                      "\xE0\x9F\xBF",
-                                      "\xFE",
-                                      "\xE2\x82",
-                                      "\xF0\x8F\xBF\xBF",
-                                      "\xC3"
-                                      "A"};
+    static const char* const bad[] = {"\x80", "\xC0\xAF", "\xC1\xBF",         "\xE0\x9F\xBF",
+                                      "\xFE", "\xE2\x82", "\xF0\x8F\xBF\xBF", "\xC3\x41"};
     std::vector<char> bytes;
     const int count = static_cast<int>(random() % 24);
     for (int i = 0; i < count; ++i) {
