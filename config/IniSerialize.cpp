@@ -11,7 +11,7 @@ namespace {
 
 const char kNullSection[] = "(null)";
 
-void AppendPiece(std::string* out, const Key& key, const char* separator, int counter,
+void AppendPiece(std::string* out, const Key& key, int quote, const char* separator, int counter,
                  std::string_view piece) {
     char number[16];
     std::snprintf(number, sizeof number, "%04d", counter);
@@ -19,12 +19,12 @@ void AppendPiece(std::string* out, const Key& key, const char* separator, int co
     *out += " Line";
     *out += number;
     *out += separator;
-    if (key.quote) {
-        *out += static_cast<char>(key.quote);
+    if (quote) {
+        *out += static_cast<char>(quote);
     }
     *out += piece;
-    if (key.quote) {
-        *out += static_cast<char>(key.quote);
+    if (quote) {
+        *out += static_cast<char>(quote);
     }
     *out += '\n';
 }
@@ -35,12 +35,25 @@ bool EnclosedInQuotes(std::string_view piece) {
            piece.back() == piece.front();
 }
 
+// The quote character the key's value is written between: its own, or, for a value
+// without one that begins and ends with a quote this store's reader strips (a joined
+// value, or one set without quotes), that quote once more, so that the value reads back
+// whole.
+int WrittenQuote(const IniStore& store, const Key& key) {
+    if (key.quote || !EnclosedInQuotes(key.Value())) {
+        return key.quote;
+    }
+    const char quote = key.Value().front();
+    const uint32_t strips = quote == '"' ? kIniParseDoubleQuotes : kIniParseSingleQuotes;
+    return (store.parseFlags & strips) ? quote : 0;
+}
+
 // The end of the next piece of value starting at begin, or begin when no piece fits.
-size_t PieceEnd(const IniStore& store, const Key& key, size_t begin, size_t allowance) {
+size_t PieceEnd(const IniStore& store, const Key& key, int quote, size_t begin, size_t allowance) {
     const std::string_view value = key.Value();
     size_t end;
     if (value.size() - begin <= allowance) {
-        if (key.quote || !EnclosedInQuotes(value.substr(begin))) {
+        if (quote || !EnclosedInQuotes(value.substr(begin))) {
             return value.size();
         }
         end = value.size() - 1;  // the rest fits, but would read back as a quoted value
@@ -54,7 +67,7 @@ size_t PieceEnd(const IniStore& store, const Key& key, size_t begin, size_t allo
             }
         }
     }
-    if (!key.quote) {
+    if (!quote) {
         // Reading trims every piece and strips the quotes of a piece enclosed in them: an
         // unquoted piece must not begin or end in white space, nor begin and end with the
         // same quote character.
@@ -74,17 +87,18 @@ bool StartsLikeMark(const std::string& text) {
 
 int AppendKey(std::string* out, const IniStore& store, const Key& key, const char* separator,
               size_t separatorLength) {
-    const size_t quotes = key.quote ? 2 : 0;
+    const int quote = WrittenQuote(store, key);
+    const size_t quotes = quote ? 2 : 0;
     const size_t length = key.Name().size() + separatorLength + key.Value().size() + quotes;
     if (store.maxLineLength < 0 || length <= static_cast<size_t>(store.maxLineLength)) {
         *out += key.Name();
         *out += separator;
-        if (key.quote) {
-            *out += static_cast<char>(key.quote);
+        if (quote) {
+            *out += static_cast<char>(quote);
         }
         *out += key.Value();
-        if (key.quote) {
-            *out += static_cast<char>(key.quote);
+        if (quote) {
+            *out += static_cast<char>(quote);
         }
         *out += '\n';
         return 0;
@@ -97,11 +111,11 @@ int AppendKey(std::string* out, const IniStore& store, const Key& key, const cha
     }
     int counter = 1;
     for (size_t begin = 0; begin < key.Value().size(); ++counter) {
-        size_t end = PieceEnd(store, key, begin, static_cast<size_t>(allowance));
+        size_t end = PieceEnd(store, key, quote, begin, static_cast<size_t>(allowance));
         if (end == begin) {
             return kIniCannotSplit;
         }
-        AppendPiece(out, key, separator, counter, key.Value().substr(begin, end - begin));
+        AppendPiece(out, key, quote, separator, counter, key.Value().substr(begin, end - begin));
         begin = end;
     }
     return 0;

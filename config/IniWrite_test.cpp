@@ -228,6 +228,33 @@ TEST(IniWrite, WrittenFilesReadBackToTheSameStore) {
         EXPECT_EQ(value, text);
     }
 
+    // A whole value without a quote character that begins and ends with a quote this
+    // store's reader strips (joined from pieces, or set without quotes) is written between
+    // one more pair of it; a quote the reader keeps is written as it is.
+    {
+        WriteAll(path, "[S]\nsi Line0001=\"aq\nsi Line0002=f\"\n");
+        Store store = NewStore(0x06);
+        ASSERT_EQ(IniLoadFile(store.get(), path.c_str()), 0);
+        IniSetValue(store.get(), "S", "single", "'x'", 0);
+        IniSetValue(store.get(), "S", "double", "\"y\"", 0);
+        IniSetWriteOptions(store.get(), -1, 0, 0);
+        ASSERT_EQ(IniWriteFile(store.get(), path.c_str()), 0);
+        EXPECT_EQ(ReadAll(path), "[S]\nsi=\"\"aqf\"\"\nsingle=''x''\ndouble=\"\"y\"\"\n\n");
+        Store reread = NewStore(0x06);
+        ASSERT_EQ(IniLoadFile(reread.get(), path.c_str()), 0);
+        for (const auto& [key, want] : {std::pair<const char*, const char*>{"si", "\"aqf\""},
+                                        {"single", "'x'"},
+                                        {"double", "\"y\""}}) {
+            ASSERT_EQ(IniGetValue(reread.get(), "S", key, &value), 1) << key;
+            EXPECT_EQ(std::string(value), want) << key;
+        }
+        Store keepsQuotes = NewStore(0x02);
+        IniSetValue(keepsQuotes.get(), "S", "single", "'x'", 0);
+        IniSetWriteOptions(keepsQuotes.get(), -1, 0, 0);
+        ASSERT_EQ(IniWriteFile(keepsQuotes.get(), path.c_str()), 0);
+        EXPECT_EQ(ReadAll(path), "[S]\nsingle='x'\n\n");
+    }
+
     // Continuation keys with blanks before " Line" join under the trimmed base name, so the
     // key is found by its name and writes back as it was read.
     {
