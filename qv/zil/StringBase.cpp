@@ -1,5 +1,6 @@
 #include "qv/zil/StringBase.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <cstring>
 #include <cwchar>
@@ -206,9 +207,9 @@ StringBase<E>& StringBase<E>::append(const StringBase& other) {
 template <typename E>
 StringBase<E>& StringBase<E>::append(size_type count, E element) {
     GrowForAppend(count);
-    for (size_type i = 0; i < count; ++i) {
-        *m_pEnd++ = element;
-    }
+    // Through a local end: a store through m_pEnd could alias m_pEnd itself, which would
+    // keep the compiler from filling more than one element per step.
+    m_pEnd = std::fill_n(m_pEnd, count, element);
     *m_pEnd = E();
     return *this;
 }

@@ -42,6 +42,8 @@ wchar_t UpperWide(wchar_t c) { return static_cast<wchar_t>(std::towupper(c)); }
 int32_t StringCompare::TextIgnoreCase(const char* a, const char* b) {
     a = a ? a : "";
     b = b ? b : "";
+    for (; *a == *b && *a != '\0'; ++a, ++b) {
+    }
     for (;; ++a, ++b) {
         const int upperA = UpperByte(*a);
         const int upperB = UpperByte(*b);
@@ -70,7 +72,12 @@ int32_t StringCompare::Ranges(const char* a, uint32_t aLength, const char* b, ui
 int32_t StringCompare::RangesIgnoreCase(const char* a, uint32_t aLength, const char* b,
                                         uint32_t bLength) {
     const uint32_t common = aLength < bLength ? aLength : bLength;
-    for (uint32_t i = 0; i < common; ++i) {
+    // Equal bytes fold to equal bytes: only from the first difference on is the locale asked.
+    uint32_t i = 0;
+    while (i < common && a[i] == b[i]) {
+        ++i;
+    }
+    for (; i < common; ++i) {
         const int upperA = UpperByte(a[i]);
         const int upperB = UpperByte(b[i]);
         if (upperA != upperB) {

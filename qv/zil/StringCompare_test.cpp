@@ -22,6 +22,10 @@ TEST(StringCompare, NarrowRanges) {
     EXPECT_EQ(0, StringCompare::RangesIgnoreCase("Text", 4, "tEXT", 4));
     EXPECT_EQ(-2, StringCompare::RangesIgnoreCase("ab", 2, "ABcd", 4));
     EXPECT_EQ(0, StringCompare::RangesIgnoreCase("a\0b", 3, "A\0B", 3));  // past embedded NULs
+    // Case folds after an equal prefix too: 'Z' > 'A', though 'Z' < 'a' byte-wise.
+    EXPECT_GT(StringCompare::RangesIgnoreCase("/lib/Z", 6, "/lib/a", 6), 0);
+    EXPECT_GT(StringCompare::TextIgnoreCase("/lib/Z", "/lib/a"), 0);
+    EXPECT_EQ(0, StringCompare::TextIgnoreCase("/lib/x", "/lib/X"));
     EXPECT_LT(StringCompare::Ranges("a\0a", 3, "a\0b", 3), 0);
     EXPECT_GT(StringCompare::Ranges("a", 1, "A", 1), 0);
     EXPECT_GT(StringCompare::Ranges("\xE9", 1, "z", 1), 0);  // raw bytes are unsigned

@@ -7,36 +7,18 @@
 
 #include "qv/zil/Exceptions.h"
 #include "qv/zil/SafeInteger.h"
+#include "qv/zil/osdep/IConvDescriptor.h"
 
 namespace qv {
 namespace zil {
 namespace osdep {
 
 using exception::InvalidArgument;
-using exception::InvalidLocale;
 
 namespace {
 
 // iconv's name for the C library's wide character set.
 constexpr const char* kWideCharset = "WCHAR_T";
-
-// Owns one conversion descriptor and closes it on every way out.
-class Descriptor {
-public:
-    Descriptor(const char* to, const char* from) : m_descriptor(iconv_open(to, from)) {
-        if (m_descriptor == reinterpret_cast<iconv_t>(-1)) {
-            QV_THROW(InvalidLocale());
-        }
-    }
-    ~Descriptor() { iconv_close(m_descriptor); }
-    Descriptor(const Descriptor&) = delete;
-    Descriptor& operator=(const Descriptor&) = delete;
-
-    iconv_t Get() const { return m_descriptor; }
-
-private:
-    iconv_t m_descriptor;
-};
 
 // A null character-set name counts as the empty one, the current locale's set.
 const char* OrLocale(const char* charset) { return charset == nullptr ? "" : charset; }
@@ -66,7 +48,7 @@ struct Direction {
 // one replacement unit is written, one input unit skipped, and the conversion goes on.
 size_t Convert(const Direction& direction, const void* input, size_t inputBytes, void* output,
                size_t outputBytes) {
-    const Descriptor descriptor(direction.to, direction.from);
+    const IConvDescriptor descriptor(direction.to, direction.from);
     char* in = static_cast<char*>(const_cast<void*>(input));
     size_t inLeft = inputBytes;
     char* out = static_cast<char*>(output);
@@ -100,7 +82,7 @@ uint32_t ToWide(const char* input, const char* inputEnd, const char* charset, wc
     const uint32_t inputBytes = Length(input, inputEnd);
     const uint32_t room = Length(output, outputEnd);
     if (inputBytes == 0 || room == 0) {
-        Descriptor check(kWideCharset, OrLocale(charset));  // an unknown set is still refused
+        IConvDescriptor check(kWideCharset, OrLocale(charset));  // an unknown set is still refused
         return 0;
     }
     const Direction direction{kWideCharset, OrLocale(charset), 1, &kWideReplacement,
@@ -116,7 +98,7 @@ uint32_t ToNarrow(const wchar_t* input, const wchar_t* inputEnd, char* output, c
     const uint32_t inputElements = Length(input, inputEnd);
     const uint32_t room = Length(output, outputEnd);
     if (inputElements == 0 || room == 0) {
-        Descriptor check(OrLocale(charset), kWideCharset);
+        IConvDescriptor check(OrLocale(charset), kWideCharset);
         return 0;
     }
     const Direction direction{OrLocale(charset), kWideCharset, sizeof(wchar_t), &kNarrowReplacement,
