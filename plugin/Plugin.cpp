@@ -8,6 +8,7 @@
 #include "plugin/SessionOperations.h"
 #include "plugin/StatusCodes.h"
 #include "plugin/VariableReader.h"
+#include "qv/zil/SafeInteger.h"
 #include "qv/zil/osdep/IntegerToString.h"
 
 namespace qv {
@@ -119,6 +120,7 @@ void Plugin::Answer(IRequestContext* context, uint32_t handle) {
     }
 
     zil::ByteString body(zil::osdep::IntegerToString(status.code), "");
+    body.reserve(zil::SafeInteger::Add(body.size() + 1, output.size()));  // one block
     body.append(1, '\t');
     body.append(output);
     const int32_t httpStatus = HttpStatusForCode(status.code);

@@ -35,7 +35,8 @@ void RemoteDataSender::Send(const ArgumentList& arguments, const ByteString& ope
         status.SetCode(m_ownStatus.code);
         return;
     }
-    ByteString parameters[kSendParameterCount];
+    // The parameters' buffers are kept for the next Send, as the client keeps its frame.
+    ByteString* const parameters = m_parameters;
     EncodeStringList(arguments, parameters[0], status);
     EncodeString(operation, parameters[1], status);
     EncodeString(output, parameters[2], status);
@@ -50,6 +51,11 @@ void RemoteDataSender::Send(const ArgumentList& arguments, const ByteString& ope
     }
     if (DropsConnection(status.code)) {
         Disconnect();
+    }
+    for (ByteString& parameter : m_parameters) {
+        if (parameter.capacity() > kKeptParameterBytes) {
+            parameter = ByteString();  // a large request's buffers are not kept
+        }
     }
 }
 

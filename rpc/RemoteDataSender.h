@@ -57,6 +57,9 @@ private:
     std::string m_socketPath;
     uint32_t m_nTimeoutMs;
     std::unique_ptr<portableRegistry::rpc::IPCClient> m_pClient;
+    // The four call parameters, reused by each Send up to this size.
+    static constexpr uint32_t kKeptParameterBytes = 64u * 1024u;
+    zil::ByteString m_parameters[kSendParameterCount];
 };
 
 }  // namespace remoteconfig

@@ -1,5 +1,6 @@
 #include "platform/ws_runtime/RequestTable.h"
 
+#include <atomic>
 #include <cstring>
 #include <memory>
 #include <mutex>
@@ -28,11 +29,32 @@ Table& TheTable() {
     return table;
 }
 
+// Counts the requests closed so far: a state found while it stood at some value has not
+// been destroyed as long as it stands there still.
+std::atomic<uint64_t> g_closed{0};
+
+// The last handle this thread looked up (a plug-in calls the runtime some hundred times
+// for one request), valid while g_closed has not moved.
+struct LastLookup {
+    uint32_t handle = 0;
+    RequestState* state = nullptr;
+    uint64_t closed = 0;
+};
+thread_local LastLookup t_last;
+
 RequestState* Lookup(uint32_t handle) {
+    LastLookup& last = t_last;
+    const uint64_t closed = g_closed.load(std::memory_order_acquire);
+    if (last.state != nullptr && last.handle == handle && last.closed == closed) {
+        return last.state;
+    }
     Table& table = TheTable();
     std::lock_guard<std::mutex> guard(table.lock);
     auto found = table.requests.find(handle);
-    return found == table.requests.end() ? nullptr : found->second.get();
+    RequestState* state = found == table.requests.end() ? nullptr : found->second.get();
+    // Read under the lock: a Close counts before it releases the lock.
+    last = LastLookup{handle, state, g_closed.load(std::memory_order_relaxed)};
+    return state;
 }
 
 }  // namespace
@@ -62,6 +84,7 @@ RequestTable::Response RequestTable::Close(uint32_t handle) {
         }
         state = std::move(found->second);
         table.requests.erase(found);
+        g_closed.fetch_add(1, std::memory_order_release);
     }
     return std::move(state->response);
 }

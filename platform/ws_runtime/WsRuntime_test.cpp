@@ -1,5 +1,7 @@
 #include <cstring>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -97,6 +99,39 @@ TEST(RequestTableTest, RuntimeFunctionsFillTheRequestsOwnResponse) {
     EXPECT_EQ(SetHTTPResponseCode_QV_GXWS_(handle, 500), -1);
     EXPECT_EQ(RequestTable::Close(handle).body, "");
     EXPECT_EQ(RequestTable::OpenCount(), 0u);
+}
+
+// Requests opened, read and closed on several threads at once: each read answers from
+// its own request, and a closed handle is unknown even to the thread that used it last.
+TEST(RequestTableTest, ThreadsServingRequestsAtOnceEachSeeTheirOwn) {
+    std::vector<std::thread> threads;
+    std::vector<int> wrong(4, 0);
+    for (size_t t = 0; t < wrong.size(); ++t) {
+        threads.emplace_back([t, &wrong] {
+            for (int i = 0; i < 500; ++i) {
+                const std::string expected = std::to_string(t) + ":" + std::to_string(i);
+                RequestVariables variables;
+                variables.AddExact("id", expected);
+                const uint32_t handle = RequestTable::Open(variables);
+                uint32_t size = 0;
+                ReadRequestVariable_C_REST_QV_GXWS_(handle, "id", nullptr, &size);
+                std::string value(size, '\0');
+                ReadRequestVariable_C_REST_QV_GXWS_(handle, "id", &value[0], &size);
+                value.pop_back();
+                WriteOutput_C_REST_QV_GXWS_(handle, value.data(),
+                                            static_cast<uint32_t>(value.size()));
+                wrong[t] +=
+                    value == expected && RequestTable::Close(handle).body == expected ? 0 : 1;
+                size = 7;
+                ReadRequestVariable_C_REST_QV_GXWS_(handle, "id", nullptr, &size);
+                wrong[t] += size == 0 ? 0 : 1;
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(std::vector<int>(wrong.size(), 0), wrong);
 }
 
 }  // namespace

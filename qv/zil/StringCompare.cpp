@@ -73,6 +73,9 @@ int32_t StringCompare::RangesIgnoreCase(const char* a, uint32_t aLength, const c
                                         uint32_t bLength) {
     const uint32_t common = aLength < bLength ? aLength : bLength;
     // Equal bytes fold to equal bytes: only from the first difference on is the locale asked.
+    if (aLength == bLength && std::memcmp(a, b, aLength) == 0) {
+        return 0;
+    }
     uint32_t i = 0;
     while (i < common && a[i] == b[i]) {
         ++i;
