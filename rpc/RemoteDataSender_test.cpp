@@ -118,6 +118,37 @@ TEST_F(RemoteDataSenderTest, EchoAndRegistryStatusAreCopiedBack) {
     EXPECT_EQ(m_server->RequestCount(), requests);
 }
 
+// The sender keeps its parameter buffers between calls: nothing of a longer earlier call
+// may show in a later frame.
+TEST_F(RemoteDataSenderTest, AFrameIsTheSameAfterLargerCallsAsFromAFreshSender) {
+    StartRegistry();
+    const ArgumentList shortList{"a", "bc"};
+    Bytes fresh;
+    {
+        RemoteDataSender sender(m_path, 5000);
+        ByteString output;
+        StatusRecord status;
+        sender.Send(shortList, "close_session", output, status);
+        ASSERT_EQ(status.code, 0);
+        fresh = m_server->LastRequestFrame();
+    }
+    RemoteDataSender sender(m_path, 5000);
+    for (const uint32_t size : {100u * 1024u, 3000u}) {  // past the kept size, then below it
+        ArgumentList longList(40, ByteString("some longer argument text"));
+        longList.push_back(ByteString(std::string(size, 'v').c_str()));
+        ByteString output;
+        StatusRecord status;
+        sender.Send(longList, "access_property", output, status);
+        ASSERT_EQ(status.code, 0);
+        ByteString shortOutput;  // the output goes to the registry too
+        status.Clear();
+        sender.Send(shortList, "close_session", shortOutput, status);
+        ASSERT_EQ(status.code, 0);
+        EXPECT_TRUE(shortOutput == ByteString("close_session\na\nbc"));
+        EXPECT_EQ(m_server->LastRequestFrame(), fresh);
+    }
+}
+
 TEST_F(RemoteDataSenderTest, ConnectsOnceTheRegistryRuns) {
     RemoteDataSender sender(m_path, 5000);
     StatusRecord status;
