@@ -4,6 +4,7 @@
 #include <cstring>
 #include <memory>
 #include <mutex>
+#include <string_view>
 #include <unordered_map>
 
 namespace qv {
@@ -14,7 +15,24 @@ namespace {
 struct RequestState {
     const RequestVariables* variables;
     RequestTable::Response response;
+    // The last variable found under its exact name: a plug-in asks for each variable
+    // twice in a row, for the size and then for the value. The name is the stored one
+    // (NUL-terminated, and without NULs since a C name found it).
+    std::string_view lastName;
+    const std::string* lastValue = nullptr;
 };
+
+// The value of `name` in the request, or null.
+const std::string* FindVariable(RequestState& state, const char* name) {
+    if (state.lastValue != nullptr && std::strcmp(name, state.lastName.data()) == 0) {
+        return state.lastValue;
+    }
+    std::string_view exactName;
+    const std::string* value = state.variables->Find(name, exactName);
+    state.lastName = exactName;
+    state.lastValue = exactName.empty() ? nullptr : value;
+    return value;
+}
 
 // The process-wide table. The lock guards the map only: a request's state is used by the
 // one thread serving it, between Open and Close.
@@ -98,6 +116,7 @@ uint32_t RequestTable::OpenCount() {
 }  // namespace wsruntime
 }  // namespace qv
 
+using qv::wsruntime::FindVariable;
 using qv::wsruntime::Lookup;
 using qv::wsruntime::RequestState;
 
@@ -108,7 +127,7 @@ extern "C" int32_t ReadRequestVariable_C_REST_QV_GXWS_(uint32_t handle, const ch
     }
     RequestState* state = Lookup(handle);
     const std::string* value =
-        (state == nullptr || name == nullptr) ? nullptr : state->variables->Find(name);
+        (state == nullptr || name == nullptr) ? nullptr : FindVariable(*state, name);
     if (value == nullptr || value->size() >= 0xFFFFFFFFu) {
         *size = 0;
         return -1;

@@ -44,9 +44,17 @@ bool RequestVariables::HeaderMatches(std::string_view header, std::string_view n
 }
 
 const std::string* RequestVariables::Find(std::string_view name) const {
+    std::string_view exactName;
+    return Find(name, exactName);
+}
+
+const std::string* RequestVariables::Find(std::string_view name,
+                                          std::string_view& exactName) const {
+    exactName = std::string_view();
     // The exact ones first, whatever the order of adding; then the headers in order.
     const auto exact = m_exact.find(name);
     if (exact != m_exact.end()) {
+        exactName = exact->first;
         return exact->second;
     }
     for (const Variable& variable : m_variables) {

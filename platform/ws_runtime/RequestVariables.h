@@ -30,6 +30,10 @@ public:
 
     // The value of the first variable that matches `name`, or null.
     const std::string* Find(std::string_view name) const;
+    // As Find; when the value is a query parameter's or form field's found under exactly
+    // this name, `exactName` also views its stored name (valid as long as this object),
+    // otherwise it is left empty.
+    const std::string* Find(std::string_view name, std::string_view& exactName) const;
 
     // True when the header name `header` answers the variable name `name`.
     static bool HeaderMatches(std::string_view header, std::string_view name);

@@ -134,6 +134,39 @@ TEST(RequestTableTest, ThreadsServingRequestsAtOnceEachSeeTheirOwn) {
     EXPECT_EQ(std::vector<int>(wrong.size(), 0), wrong);
 }
 
+// The runtime remembers the last variable a request found; a plug-in that reuses one name
+// buffer for the next name must still get that name's value.
+TEST(RequestTableTest, EachReadAnswersTheNameAskedForEvenInAReusedBuffer) {
+    RequestVariables variables;
+    variables.AddExact("value1", "one");
+    variables.AddExact("value2", "second");
+    variables.AddExact("X-QV-Accept", "exact");
+    variables.AddHeader("X-QV-Accept", "header");
+    const uint32_t handle = RequestTable::Open(variables);
+    const auto read = [handle](const char* asked) {
+        uint32_t size = 0;
+        ReadRequestVariable_C_REST_QV_GXWS_(handle, asked, nullptr, &size);
+        std::string value(size, 'x');
+        if (size != 0) {
+            ReadRequestVariable_C_REST_QV_GXWS_(handle, asked, &value[0], &size);
+            value.pop_back();
+        }
+        return value;
+    };
+    char name[16] = "value1";
+    EXPECT_EQ("one", read(name));
+    name[5] = '2';
+    EXPECT_EQ("second", read(name));
+    name[5] = '3';
+    EXPECT_EQ("", read(name)) << "absent, not the last one found";
+    EXPECT_EQ("header", read("X_QV_ACCEPT"));
+    EXPECT_EQ("exact", read("X-QV-Accept"));
+    EXPECT_EQ("header", read("x-qv-accept"));
+    name[5] = '1';
+    EXPECT_EQ("one", read(name));
+    RequestTable::Close(handle);
+}
+
 }  // namespace
 }  // namespace wsruntime
 }  // namespace qv
