@@ -8,7 +8,6 @@
 #include "plugin/SessionOperations.h"
 #include "plugin/StatusCodes.h"
 #include "plugin/VariableReader.h"
-#include "qv/zil/SafeInteger.h"
 #include "qv/zil/osdep/IntegerToString.h"
 
 namespace qv {
@@ -119,10 +118,12 @@ void Plugin::Answer(IRequestContext* context, uint32_t handle) {
         status.SetCode(kNotInitialised);
     }
 
-    zil::ByteString body(zil::osdep::IntegerToString(status.code), "");
-    body.reserve(zil::SafeInteger::Add(body.size() + 1, output.size()));  // one block
-    body.append(1, '\t');
-    body.append(output);
+    // The body is the code, a tab and the output text: put in front of the text in its
+    // own block, which then grows by a few bytes at most instead of being copied.
+    zil::ByteString prefix(zil::osdep::IntegerToString(status.code), "");
+    prefix.append(1, '\t');
+    zil::ByteString& body = output;
+    body.replace(0, 0, prefix);
     const int32_t httpStatus = HttpStatusForCode(status.code);
     if (httpStatus != 0) {
         SetHTTPResponseCode_QV_GXWS_(handle, httpStatus);

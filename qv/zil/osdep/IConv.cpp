@@ -1,6 +1,7 @@
 #include "qv/zil/osdep/IConv.h"
 
 #include <iconv.h>
+#include <langinfo.h>
 
 #include <cerrno>
 #include <cstring>
@@ -73,6 +74,45 @@ size_t Convert(const Direction& direction, const void* input, size_t inputBytes,
     return outputBytes - outLeft;
 }
 
+// True when `charset` ("" = the locale's) holds the 128 ASCII characters as the bytes
+// 0-127, one byte each, under the name iconv and the locale give it: UTF-8, ASCII and the
+// ISO 8859 parts. Text of ASCII characters alone then converts byte for element without
+// iconv; any other name, suffixes such as "//TRANSLIT" included, goes through iconv.
+bool KeepsAsciiAsIs(const char* charset) {
+    const char* name = *charset == '\0' ? nl_langinfo(CODESET) : charset;
+    if (std::strcmp(name, "UTF-8") == 0 || std::strcmp(name, "ANSI_X3.4-1968") == 0) {
+        return true;
+    }
+    static const char kIso8859[] = "ISO-8859-";
+    if (std::strncmp(name, kIso8859, sizeof kIso8859 - 1) != 0) {
+        return false;
+    }
+    // The parts there are: 1 to 16 without 12.
+    const char* part = name + sizeof kIso8859 - 1;
+    const size_t digits = std::strspn(part, "0123456789");
+    if (digits == 0 || digits > 2 || part[digits] != '\0' || part[0] == '0') {
+        return false;
+    }
+    const int number = digits == 1 ? part[0] - '0' : (part[0] - '0') * 10 + (part[1] - '0');
+    return number <= 16 && number != 12;
+}
+
+// Copies ASCII text unit for unit into at most `room` units; false (nothing written) when
+// some unit is not ASCII. Returns the number of units written in `written`.
+template <typename From, typename To>
+bool CopyAscii(const From* input, uint32_t count, To* output, uint32_t room, uint32_t& written) {
+    for (uint32_t i = 0; i < count; ++i) {
+        if (static_cast<uint32_t>(input[i]) >= 0x80u) {
+            return false;
+        }
+    }
+    written = count < room ? count : room;
+    for (uint32_t i = 0; i < written; ++i) {
+        output[i] = static_cast<To>(input[i]);
+    }
+    return true;
+}
+
 const wchar_t kWideReplacement = L'?';
 const char kNarrowReplacement = '?';
 
@@ -84,6 +124,10 @@ uint32_t ToWide(const char* input, const char* inputEnd, const char* charset, wc
     if (inputBytes == 0 || room == 0) {
         IConvDescriptor check(kWideCharset, OrLocale(charset));  // an unknown set is still refused
         return 0;
+    }
+    uint32_t written = 0;
+    if (KeepsAsciiAsIs(OrLocale(charset)) && CopyAscii(input, inputBytes, output, room, written)) {
+        return written;
     }
     const Direction direction{kWideCharset, OrLocale(charset), 1, &kWideReplacement,
                               sizeof(wchar_t)};
@@ -100,6 +144,11 @@ uint32_t ToNarrow(const wchar_t* input, const wchar_t* inputEnd, char* output, c
     if (inputElements == 0 || room == 0) {
         IConvDescriptor check(OrLocale(charset), kWideCharset);
         return 0;
+    }
+    uint32_t written = 0;
+    if (KeepsAsciiAsIs(OrLocale(charset)) &&
+        CopyAscii(input, inputElements, output, room, written)) {
+        return written;
     }
     const Direction direction{OrLocale(charset), kWideCharset, sizeof(wchar_t), &kNarrowReplacement,
                               1};

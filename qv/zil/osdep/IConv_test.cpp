@@ -74,6 +74,34 @@ TEST(IConvTest, ConvertsBetweenNamedCharacterSetsAndWide) {
     EXPECT_EQ(std::vector<uint32_t>({0x20AC}), ToWide("\xA4", "ISO-8859-15"));
 }
 
+// ASCII text into a set that keeps ASCII as it is is copied without iconv: the result
+// must be what iconv gives, room and all, and any other set or name still goes to iconv.
+TEST(IConvTest, AsciiTextConvertsAlikeWithAndWithoutIConv) {
+    const std::vector<wchar_t> ascii = WideText({'o', 'p', '\0', 0x7F, '='});
+    const std::string bytes("op\0\x7F=", 5);
+    for (const char* set : {"UTF-8", "ISO-8859-1", "ISO-8859-15", "ANSI_X3.4-1968", "", "UTF8",
+                            "US-ASCII", "UTF-8//TRANSLIT", "ISO-8859-1//IGNORE"}) {
+        EXPECT_EQ(bytes, ToNarrow(ascii, set)) << set;
+        EXPECT_EQ(std::vector<uint32_t>({'o', 'p', 0, 0x7F, '='}), ToWide(bytes, set)) << set;
+    }
+    // Sets in which ASCII is not one byte each.
+    EXPECT_EQ(std::string("o\0p\0", 4), ToNarrow(WideText({'o', 'p'}), "UTF-16LE"));
+    EXPECT_EQ(std::vector<uint32_t>({0x706F}), ToWide("op", "UTF-16LE"));
+    EXPECT_EQ("\x96\x97", ToNarrow(WideText({'o', 'p'}), "EBCDIC-US"));
+    // Stops at the room like iconv, and one non-ASCII unit sends the whole text to iconv.
+    char narrow[3] = {'#', '#', '#'};
+    EXPECT_EQ(
+        2u, IConv::WideToNarrowCount(ascii.data(), ascii.data() + 5, narrow, narrow + 2, "UTF-8"));
+    EXPECT_EQ("op#", std::string(narrow, 3));
+    EXPECT_EQ("a\xC3\xA9", ToNarrow(WideText({'a', 0xE9}), "UTF-8"));
+    EXPECT_EQ("a\xE9", ToNarrow(WideText({'a', 0xE9}), "ISO-8859-1"));
+    EXPECT_EQ("a?", ToNarrow(WideText({'a', 0xE9}), "ANSI_X3.4-1968"));
+    for (const char* unknown : {"ISO-8859-12", "ISO-8859-17", "ISO-8859-01", "ISO-8859-"}) {
+        EXPECT_THROW(ToNarrow(WideText({'a'}), unknown), InvalidLocale) << unknown;
+    }
+    EXPECT_EQ("a", ToNarrow(WideText({'a'}), "ISO-8859-16"));
+}
+
 TEST(IConvTest, EachUnitThatCannotBeConvertedBecomesOneQuestionMark) {
     EXPECT_EQ("a?b", ToNarrow(WideText({'a', 0xE9, 'b'}), "US-ASCII"));
     // Surrogates and values of 32 bits are not characters for iconv; each wide element
