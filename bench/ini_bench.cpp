@@ -7,7 +7,10 @@
 // largest single section.
 // Each benchmark runs in a child process of its own (fork), so that the heap left behind by
 // one case (pages glibc keeps or has given back, a raised mmap threshold) does not bend the
-// times of the next; --in_process runs them all in this process instead.
+// times of the next; --in_process runs them all in this process instead. Times are the
+// medians of five repetitions unless --benchmark_repetitions says otherwise. The growth/
+// benchmarks load the 10k- and 100k-key files in turn in one process, so that the growth
+// from one to the other is measured with the machine's drift paired out.
 #include <benchmark/benchmark.h>
 
 #include <INIReader.h>
@@ -16,6 +19,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -23,6 +27,7 @@
 #include <regex>
 #include <stdexcept>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "config/IniStore.h"
@@ -131,6 +136,60 @@ void LoadBare(benchmark::State& state, std::string path) {
     }
 }
 
+// One load of a file by one of the contenders; false when it failed.
+using Loader = bool (*)(const std::string& path);
+
+bool LoadOnceOurs(const std::string& path) {
+    IniStore* store = IniCreate();
+    IniSetParseFlags(store, 0x12);
+    const bool loaded = IniLoadFile(store, path.c_str()) == 0;
+    benchmark::DoNotOptimize(IniSectionCount(store));
+    IniDestroy(store);
+    return loaded;
+}
+
+bool LoadOnceINIReader(const std::string& path) {
+    INIReader reader(path);
+    benchmark::DoNotOptimize(&reader);
+    return reader.ParseError() == 0;
+}
+
+bool LoadOnceBare(const std::string& path) {
+    return ini_parse(path.c_str(), &Ignore, nullptr) == 0;
+}
+
+// Growth from 10k to 100k keys paired in time: each iteration loads the 10k-key file ten
+// times and the 100k-key file once, so that both meet the same state of the machine; the
+// ratio of the two sums is the growth with the machine's drift paired out.
+void PairedGrowth(benchmark::State& state, std::string layout, Loader load) {
+    const std::string small = TheFiles().Path(layout.c_str(), 10000);
+    const std::string large = TheFiles().Path(layout.c_str(), 100000);
+    using Clock = std::chrono::steady_clock;
+    Clock::duration smallTime{};
+    Clock::duration largeTime{};
+    for (auto _ : state) {
+        const Clock::time_point start = Clock::now();
+        bool loaded = true;
+        for (int i = 0; i < 10; ++i) {
+            loaded = load(small) && loaded;
+        }
+        const Clock::time_point middle = Clock::now();
+        loaded = load(large) && loaded;
+        const Clock::time_point end = Clock::now();
+        if (!loaded) {
+            state.SkipWithError("a load failed");
+            break;
+        }
+        smallTime += middle - start;
+        largeTime += end - middle;
+    }
+    if (smallTime.count() > 0) {
+        // Ten small loads per iteration: ten times the large-to-small ratio of the sums.
+        state.counters["growth"] = 10.0 * std::chrono::duration<double>(largeTime).count() /
+                                   std::chrono::duration<double>(smallTime).count();
+    }
+}
+
 // Looks up every 97th key of the 100k-key single section by name.
 void LookupOurs(benchmark::State& state) {
     IniStore* store = IniCreate();
@@ -173,14 +232,17 @@ public:
                 continue;
             }
             const double toMs = 1e3 / benchmark::GetTimeUnitMultiplier(run.time_unit);
-            m_ms[run.run_name.function_name] = {run.GetAdjustedRealTime() * toMs,
-                                                run.GetAdjustedCPUTime() * toMs};
+            const auto growth = run.counters.find("growth");
+            m_ms[run.run_name.function_name] = {
+                run.GetAdjustedRealTime() * toMs, run.GetAdjustedCPUTime() * toMs,
+                growth == run.counters.end() ? 0.0 : static_cast<double>(growth->second)};
         }
     }
     // Real (wall-clock) and CPU time per load of a benchmark, 0 when it did not run.
     struct Times {
         double real = 0.0;
         double cpu = 0.0;
+        double growth = 0.0;  // the paired growth benchmarks' counter
     };
     Times Get(const std::string& name) const {
         auto found = m_ms.find(name);
@@ -195,6 +257,10 @@ private:
 
 std::string Name(const char* who, const char* layout, int keys) {
     return std::string("load/") + who + "/" + layout + "/" + std::to_string(keys);
+}
+
+std::string GrowthName(const char* who, const char* layout) {
+    return std::string("growth/") + who + "/" + layout;
 }
 
 // Runs the one benchmark called name in a child process and takes its time into reporter;
@@ -241,15 +307,26 @@ bool RunIsolated(const std::string& name, CollectingReporter* reporter) {
 int main(int argc, char** argv) {
     // Our one flag; the rest are Google Benchmark's.
     bool inProcess = false;
-    int kept = 1;
+    bool repetitionsGiven = false;
+    std::vector<char*> args{argv[0]};
     for (int i = 1; i < argc; ++i) {
         if (std::strcmp(argv[i], "--in_process") == 0) {
             inProcess = true;
         } else {
-            argv[kept++] = argv[i];
+            repetitionsGiven |= std::strncmp(argv[i], "--benchmark_repetitions", 23) == 0;
+            args.push_back(argv[i]);
         }
     }
-    argc = kept;
+    // A single load time moves by a fifth between runs here: the medians of five
+    // repetitions unless told otherwise.
+    char repetitions[] = "--benchmark_repetitions=5";
+    char aggregatesOnly[] = "--benchmark_display_aggregates_only=true";
+    if (!repetitionsGiven) {
+        args.push_back(repetitions);
+        args.push_back(aggregatesOnly);
+    }
+    argc = static_cast<int>(args.size());
+    argv = args.data();
     std::vector<std::string> names;
     for (const char* layout : kLayouts) {
         for (int keys : kSizes) {
@@ -267,6 +344,17 @@ int main(int argc, char** argv) {
             for (const char* who : {"ours", "ours-reload", "INIReader", "bare"}) {
                 names.push_back(Name(who, layout, keys));
             }
+        }
+    }
+    const std::pair<const char*, Loader> kLoaders[] = {
+        {"ours", LoadOnceOurs}, {"INIReader", LoadOnceINIReader}, {"bare", LoadOnceBare}};
+    for (const char* layout : kLayouts) {
+        for (const auto& loader : kLoaders) {
+            const std::string name = GrowthName(loader.first, layout);
+            benchmark::RegisterBenchmark(name.c_str(), PairedGrowth, std::string(layout),
+                                         loader.second)
+                ->Unit(benchmark::kMillisecond);
+            names.push_back(name);
         }
     }
     benchmark::RegisterBenchmark("lookup/ours/single/100000", LookupOurs);
@@ -312,14 +400,20 @@ int main(int argc, char** argv) {
     }
     // CPU time beside real time: on a busy machine the wall clock also counts the time the
     // process waited for a core, which says nothing about how loading grows.
-    std::printf("\ngrowth 10k -> 100k keys (linear is 10x)  real     cpu\n");
+    // "paired": the growth/ benchmarks, 10k and 100k loads in turn in one process.
+    std::printf("\ngrowth 10k -> 100k keys (linear is 10x)  real     cpu  paired\n");
     for (const char* layout : kLayouts) {
         for (const char* who : {"ours", "ours-reload", "INIReader", "bare"}) {
             const auto small = reporter.Get(Name(who, layout, 10000));
             const auto large = reporter.Get(Name(who, layout, 100000));
+            const double paired = reporter.Get(GrowthName(who, layout)).growth;
             if (small.real > 0.0 && large.real > 0.0 && small.cpu > 0.0) {
-                std::printf("%-10s %-28s %6.2fx %6.2fx\n", layout, who, large.real / small.real,
+                std::printf("%-10s %-28s %6.2fx %6.2fx", layout, who, large.real / small.real,
                             large.cpu / small.cpu);
+                if (paired > 0.0) {
+                    std::printf(" %6.2fx", paired);
+                }
+                std::printf("\n");
             }
         }
     }
